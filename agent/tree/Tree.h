@@ -1,0 +1,63 @@
+/**
+ * @file
+ * The instrumentation tree as one immutable value: what every cursor reads.
+ */
+#pragma once
+
+#include "instrumentation/NodeLexicon.h"
+
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <variant>
+#include <vector>
+
+namespace Orv::Agent {
+
+using PropertyValue = std::variant<unsigned int, std::string, std::vector<std::string>>;
+using PropertyMap = std::map<NodeLexicon::Properties, PropertyValue>;
+
+/** One node. All texts are valid UTF-8 without control characters. */
+struct Node {
+    std::string path;                          ///< unique in its tree; opaque to the provider
+    std::string parentPath;                    ///< empty at the root
+    std::optional<NodeLexicon::NodeType> type; ///< none for the host, chassis and device nodes
+    std::string description;
+    PropertyMap properties;
+
+    bool operator==(const Node&) const = default;
+};
+
+/**
+ * A whole tree. Immutable once built, so any number of threads may read it; nodes are shared between one tree and the
+ * next, so that a change of one node does not copy the others.
+ */
+class Tree {
+  public:
+    using NodePointer = std::shared_ptr<const Node>;
+
+    Tree() = default;
+
+    /** Takes the nodes in the order in which cursors will meet them. Of two nodes of one path the later is dropped.
+     */
+    explicit Tree(std::vector<NodePointer> nodes);
+
+    /** The nodes of a type in iteration order. */
+    [[nodiscard]] const std::vector<NodePointer>& nodesOfType(NodeLexicon::NodeType type) const;
+
+    /** The node at a path, or null. */
+    [[nodiscard]] NodePointer find(std::string_view path) const;
+
+    /** All nodes in iteration order. */
+    [[nodiscard]] const std::vector<NodePointer>& nodes() const { return _nodes; }
+
+  private:
+    std::vector<NodePointer> _nodes;
+    std::map<NodeLexicon::NodeType, std::vector<NodePointer>> _byType;
+    std::unordered_map<std::string_view, NodePointer> _byPath; ///< keys point into the nodes
+};
+
+} // namespace Orv::Agent

@@ -1,0 +1,72 @@
+/**
+ * @file
+ * The object manager: finds the provider of a class, calls it as CMPI has it, and hands on what it answers.
+ */
+#pragma once
+
+#include "host/model/Instance.h"
+#include "host/schema/Schema.h"
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace marlo {
+
+/** How a CIM operation ended: a CIM status code and, unless it is CMPI_RC_OK, what was wrong. */
+struct Status {
+    CMPIrc code = CMPI_RC_OK;
+    std::string message;
+    /** Failures that the agent logged on this call's thread although the operation itself was answered. */
+    std::vector<std::string> reported;
+
+    [[nodiscard]] bool ok() const { return code == CMPI_RC_OK; }
+};
+
+/** "CIM_ERR_NOT_FOUND" and the like for a status code. */
+std::string statusName(CMPIrc code);
+
+/** Property names that the client asked for; none asked means all. */
+using PropertyList = std::optional<std::vector<std::string>>;
+
+struct ObjectManagerOptions {
+    std::string schemaDirectory;   ///< *.mof
+    std::string providerDirectory; ///< *.toml, a registration file per provider library
+    std::string libraryDirectory;  ///< where registered libraries with a relative name lie
+};
+
+/**
+ * One object manager. Operations may be called from any thread, concurrently. What providers throw is answered
+ * CMPI_RC_ERR_FAILED with its text. Providers are loaded at the first request for one of their classes.
+ */
+class ObjectManager {
+  public:
+    /** Reads schema and registrations. Throws std::runtime_error with file, line and reason. */
+    explicit ObjectManager(const ObjectManagerOptions& options);
+    ~ObjectManager();
+    ObjectManager(const ObjectManager&) = delete;
+    ObjectManager& operator=(const ObjectManager&) = delete;
+
+    using InstanceSink = std::function<void(Instance&&)>;
+    using PathSink = std::function<void(ObjectPath&&)>;
+
+    /**
+     * Instances of a class and of its subclasses, each with a complete path (namespace and keys, no host) and with
+     * the properties that were asked for.
+     */
+    Status enumerateInstances(const std::string& nameSpace, const std::string& className,
+                              const PropertyList& properties, const InstanceSink& sink);
+    Status enumerateInstanceNames(const std::string& nameSpace, const std::string& className, const PathSink& sink);
+    /** The instance at a path with all its keys; CMPI_RC_ERR_NOT_FOUND when the provider knows none. */
+    Status getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+
+    [[nodiscard]] const Schema& schema() const;
+
+  private:
+    struct State;
+    std::unique_ptr<State> _state;
+};
+
+} // namespace marlo

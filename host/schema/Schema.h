@@ -1,0 +1,111 @@
+/**
+ * @file
+ * CIM classes and qualifiers as read from MOF (DSP0004, DSP0221).
+ */
+#pragma once
+
+#include "host/model/Instance.h"
+
+#include <map>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace marlo {
+
+using Qualifiers = std::vector<NamedValue>;
+
+/** A qualifier declaration. */
+struct QualifierType {
+    std::string name;
+    Value defaultValue; ///< its type is the qualifier's type
+    std::vector<std::string> scopes;
+    bool overridable = true;
+    bool toSubclass = true;
+    bool translatable = false;
+};
+
+/** A property of a class, declared there or inherited. */
+struct Property {
+    std::string name;
+    CMPIType type = CMPI_null;  ///< CMPI_ARRAY set for arrays
+    std::string referenceClass; ///< for CMPI_ref
+    Value defaultValue;         ///< NULL of the type where none is declared
+    Qualifiers qualifiers;
+    std::string origin; ///< the class that introduced it
+    bool key = false;
+};
+
+struct Parameter {
+    std::string name;
+    CMPIType type = CMPI_null;
+    std::string referenceClass;
+    Qualifiers qualifiers;
+    bool in = true;
+    bool out = false;
+};
+
+struct Method {
+    std::string name;
+    CMPIType returnType = CMPI_null;
+    std::vector<Parameter> parameters;
+    Qualifiers qualifiers;
+    std::string origin;
+};
+
+/** A class with everything it inherits: properties and methods of the superclasses first, overrides in their place.
+ */
+struct Class {
+    std::string name;
+    std::string superClass; ///< empty for a root
+    std::vector<Property> properties;
+    std::vector<Method> methods;
+    Qualifiers qualifiers;
+    bool isAbstract = false;
+    bool isAssociation = false;
+    bool isIndication = false;
+    std::string file; ///< where it was declared
+    int line = 0;
+
+    [[nodiscard]] const Property* findProperty(std::string_view propertyName) const;
+    [[nodiscard]] const Method* findMethod(std::string_view methodName) const;
+    [[nodiscard]] std::vector<const Property*> keys() const;
+};
+
+/** All classes and qualifier types, by namespace. Immutable after reading; names are compared without case. */
+class Schema {
+  public:
+    Schema();
+    ~Schema();
+    Schema(Schema&&) noexcept;
+    Schema& operator=(Schema&&) noexcept;
+
+    /**
+     * Reads the MOF files of a directory, in the order of their names. Declarations that precede any
+     * `#pragma namespace ("...")` of a file belong to every namespace; a class may come before its superclass.
+     * Throws std::runtime_error with file, line and reason for the first error; nothing of a wrong schema is served.
+     */
+    static Schema readDirectory(const std::string& directory);
+
+    /** The same from one text, for tests; `name` stands for the file in messages. */
+    static Schema readText(std::string_view text, const std::string& name);
+
+    [[nodiscard]] std::vector<std::string> nameSpaces() const;
+    [[nodiscard]] bool hasNameSpace(std::string_view nameSpace) const;
+    [[nodiscard]] const Class* findClass(std::string_view nameSpace, std::string_view className) const;
+    /** All classes of a namespace, each after its superclass. */
+    [[nodiscard]] std::vector<const Class*> classes(std::string_view nameSpace) const;
+    /** True when `className` is `ancestor` or derives from it; false for unknown classes. */
+    [[nodiscard]] bool isA(std::string_view nameSpace, std::string_view className, std::string_view ancestor) const;
+    /** The class itself and everything that derives from it, each after its superclass. */
+    [[nodiscard]] std::vector<const Class*> withSubclasses(std::string_view nameSpace,
+                                                           std::string_view className) const;
+    [[nodiscard]] std::vector<const QualifierType*> qualifierTypes(std::string_view nameSpace) const;
+
+  private:
+    struct State;
+    std::unique_ptr<State> _state;
+};
+
+} // namespace marlo
