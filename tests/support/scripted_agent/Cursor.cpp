@@ -1,0 +1,264 @@
+#include "instrumentation/DateTime.h"
+#include "tests/support/scripted_agent/Recorder.h"
+#include "tests/support/scripted_agent/ScriptedAgent.h"
+
+#include <algorithm>
+#include <stdexcept>
+
+using scripted_agent::add;
+using scripted_agent::announce;
+using scripted_agent::Node;
+using scripted_agent::quoted;
+using scripted_agent::script;
+
+namespace {
+
+std::string nameOf(Orv::NodeLexicon::NodeType type) {
+    return type == Orv::NodeLexicon::NODE_NETWORK_ADAPTER ? "NODE_NETWORK_ADAPTER"
+           : type == Orv::NodeLexicon::NODE_NETWORK_PORT  ? "NODE_NETWORK_PORT"
+                                                          : std::to_string(type);
+}
+
+std::string nameOf(Orv::NodeLexicon::Properties property) {
+    using namespace Orv::NodeLexicon;
+    static const std::map<Properties, std::string> names{
+        {PROP_DHCP_ENABLED, "PROP_DHCP_ENABLED"},
+        {PROP_IPV4_ADDRESS, "PROP_IPV4_ADDRESS"},
+        {PROP_IPV4_SUBNET_MASK, "PROP_IPV4_SUBNET_MASK"},
+        {PROP_IPV6_ADDRESS, "PROP_IPV6_ADDRESS"},
+        {PROP_DNS_SERVERS, "PROP_DNS_SERVERS"},
+        {PROP_IP_SUPPORT, "PROP_IP_SUPPORT"},
+        {PROP_DNS_HOSTNAME, "PROP_DNS_HOSTNAME"},
+        {PROP_DNS_DOMAIN, "PROP_DNS_DOMAIN"},
+        {PROP_DNS_SUFFIXES, "PROP_DNS_SUFFIXES"},
+        {PROP_DEFAULT_GATEWAY, "PROP_DEFAULT_GATEWAY"},
+        {PROP_NODE_STRING, "PROP_NODE_STRING"},
+        {PROP_MAC_ADDRESS, "PROP_MAC_ADDRESS"},
+        {PROP_STATUS, "PROP_STATUS"},
+    };
+    const auto found = names.find(property);
+    return found != names.end() ? found->second : std::to_string(property);
+}
+
+std::string shown(const std::string& value) {
+    return quoted(value.c_str());
+}
+
+std::string shown(unsigned int value) {
+    return std::to_string(value);
+}
+
+std::string shown(const std::vector<std::string>& values) {
+    std::string text = "[";
+    for (const std::string& value : values) {
+        text += (text.size() > 1 ? ", " : "") + shown(value);
+    }
+    return text + "]";
+}
+
+std::map<Orv::NodeLexicon::Properties, std::string>& propertiesOf(Node& node, const std::string&) {
+    return node.texts;
+}
+
+std::map<Orv::NodeLexicon::Properties, unsigned int>& propertiesOf(Node& node, unsigned int) {
+    return node.numbers;
+}
+
+std::map<Orv::NodeLexicon::Properties, std::vector<std::string>>& propertiesOf(Node& node,
+                                                                               const std::vector<std::string>&) {
+    return node.lists;
+}
+
+} // namespace
+
+namespace Orv {
+
+struct Instrumentation::State {
+    int number;
+    std::vector<Node*> selection;
+    std::size_t position = 0;
+
+    void announced(const std::string& call) const {
+        announce(call);
+        add("cursor " + std::to_string(number) + ": " + call);
+    }
+
+    void told(const std::string& call, const std::string& result) const {
+        add("cursor " + std::to_string(number) + ": " + call + " = " + result);
+    }
+
+    [[nodiscard]] bool stands() const { return position < selection.size(); }
+
+    Node& node() const {
+        if (!stands()) {
+            throw std::logic_error("the cursor stands on no node");
+        }
+        return *selection[position];
+    }
+
+    template <typename Value>
+    bool read(NodeLexicon::Properties property, Value& value) const {
+        const std::string call = "getProperty(" + nameOf(property) + ")";
+        announce(call);
+        auto& properties = propertiesOf(node(), value);
+        const auto found = properties.find(property);
+        told(call, found != properties.end() ? shown(found->second) : "absent");
+        if (found == properties.end()) {
+            return false;
+        }
+        value = found->second;
+        return true;
+    }
+
+    template <typename Value>
+    void write(NodeLexicon::Properties property, const Value& value) const {
+        announced("setProperty(" + nameOf(property) + ", " + shown(value) + ")");
+        propertiesOf(node(), value)[property] = value;
+    }
+};
+
+Instrumentation::Instrumentation() : _state(nullptr) {
+    announce("Instrumentation()");
+    _state = new State{scripted_agent::nextCursor(), {}};
+    add("cursor " + std::to_string(_state->number) + ": Instrumentation()");
+}
+
+Instrumentation::~Instrumentation() {
+    add("cursor " + std::to_string(_state->number) + ": ~Instrumentation()");
+    delete _state;
+}
+
+void Instrumentation::selectNode(NodeLexicon::NodeType type) {
+    _state->announced("selectNode(" + nameOf(type) + ")");
+    _state->selection.clear();
+    _state->position = 0;
+    for (Node& node : script().nodes) {
+        if (node.type == type) {
+            _state->selection.push_back(&node);
+        }
+    }
+}
+
+void Instrumentation::selectNode(const std::string& path) {
+    _state->announced("selectNode(" + shown(path) + ")");
+    _state->selection.clear();
+    _state->position = 0;
+    const auto found =
+        std::find_if(script().nodes.begin(), script().nodes.end(), [&](Node& node) { return node.path == path; });
+    if (found != script().nodes.end()) {
+        _state->selection.push_back(&*found);
+    }
+}
+
+Instrumentation::operator bool() const {
+    announce("bool");
+    _state->told("bool", _state->stands() ? "true" : "false");
+    return _state->stands();
+}
+
+Instrumentation& Instrumentation::operator++() {
+    _state->announced("++");
+    ++_state->position;
+    return *this;
+}
+
+bool Instrumentation::getProperty(NodeLexicon::Properties property, std::string& value) {
+    return _state->read(property, value);
+}
+
+bool Instrumentation::getProperty(NodeLexicon::Properties property, unsigned int& value) {
+    return _state->read(property, value);
+}
+
+bool Instrumentation::getProperty(NodeLexicon::Properties property, std::vector<std::string>& value) {
+    return _state->read(property, value);
+}
+
+void Instrumentation::setProperty(NodeLexicon::Properties property, std::string& value) {
+    _state->write(property, value);
+}
+
+void Instrumentation::setProperty(NodeLexicon::Properties property, unsigned int& value) {
+    _state->write(property, value);
+}
+
+void Instrumentation::setProperty(NodeLexicon::Properties property, std::vector<std::string> value) {
+    _state->write(property, value);
+}
+
+std::string Instrumentation::getNodeDescription() {
+    announce("getNodeDescription()");
+    std::string description = _state->node().description;
+    _state->told("getNodeDescription()", shown(description));
+    return description;
+}
+
+std::string Instrumentation::getPathToParentNode() {
+    announce("getPathToParentNode()");
+    std::string parent = _state->node().parent;
+    _state->told("getPathToParentNode()", shown(parent));
+    return parent;
+}
+
+void Instrumentation::startMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
+    _state->announced("startMonitoring(" + nameOf(type) + ")");
+    script().monitorings.push_back({type, callback, context});
+}
+
+void Instrumentation::stopMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
+    _state->announced("stopMonitoring(" + nameOf(type) + ")");
+    std::erase(script().monitorings, scripted_agent::Monitoring{type, callback, context});
+}
+
+struct DateTime::State {
+    Fields fields;
+};
+
+DateTime::DateTime() : DateTime(Fields{}) {}
+
+DateTime::DateTime(const Fields& fields) : _state(new State{fields}) {}
+
+DateTime::DateTime(const DateTime& other) : DateTime(other._state->fields) {}
+
+DateTime& DateTime::operator=(const DateTime& other) {
+    *_state = *other._state;
+    return *this;
+}
+
+DateTime::~DateTime() {
+    delete _state;
+}
+
+unsigned short DateTime::getYear() const {
+    return _state->fields.year;
+}
+
+unsigned short DateTime::getMonth() const {
+    return _state->fields.month;
+}
+
+unsigned short DateTime::getDay() const {
+    return _state->fields.day;
+}
+
+unsigned short DateTime::getHour() const {
+    return _state->fields.hour;
+}
+
+unsigned short DateTime::getMinute() const {
+    return _state->fields.minute;
+}
+
+unsigned short DateTime::getSecond() const {
+    return _state->fields.second;
+}
+
+unsigned short DateTime::getMillisecond() const {
+    return _state->fields.millisecond;
+}
+
+short DateTime::getOffset() const {
+    return _state->fields.offset;
+}
+
+} // namespace Orv

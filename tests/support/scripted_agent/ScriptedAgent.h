@@ -1,0 +1,88 @@
+/**
+ * @file
+ * The control side of the scripted agent library.
+ *
+ * A script says which nodes there are and which calls fail; every call of an instrumentation, utility or log
+ * operation is recorded as one line, in order:
+ *
+ *     cursor 1: Instrumentation()
+ *     cursor 1: selectNode(NODE_NETWORK_ADAPTER)
+ *     cursor 1: bool = true
+ *     cursor 1: getProperty(PROP_STATUS) = 1
+ *     stripSpaces("OK") = "OK"
+ *     buffer << "..."
+ *     log 4000 Hearth.NetworkAdapterProvider NetworkAdapterConfiguration:57 getNicStatus | text
+ *
+ * A script is set up while no provider call is running; recording is safe from any thread.
+ */
+#pragma once
+
+#include "instrumentation/Instrumentation.h"
+#include "instrumentation/Utilities.h"
+
+#include <functional>
+#include <map>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace scripted_agent {
+
+/** A node has exactly the properties that are named here. */
+struct Node {
+    Orv::NodeLexicon::NodeType type = Orv::NodeLexicon::NODE_NETWORK_ADAPTER;
+    std::string path;
+    std::string parent; ///< path of the parent
+    std::string description;
+    std::map<Orv::NodeLexicon::Properties, std::string> texts;
+    std::map<Orv::NodeLexicon::Properties, unsigned int> numbers;
+    std::map<Orv::NodeLexicon::Properties, std::vector<std::string>> lists;
+};
+
+/** A monitoring that was started and not stopped. */
+struct Monitoring {
+    Orv::NodeLexicon::NodeType type;
+    Orv::Instrumentation::MonitoringCallback callback;
+    const void* context;
+    bool operator==(const Monitoring&) const = default;
+};
+
+struct Script {
+    std::vector<Node> nodes; ///< selections have them in this order; of several with one path the first is found
+    bool recording = true;
+    std::string systemName = "host.example.org";
+
+    /** Called with every call, as recorded but without cursor and result, before it does its work. May throw. */
+    std::function<void(std::string_view call)> before;
+
+    /* What stands in for a utility; by default each does what its declaration says. */
+    std::function<bool(const char*, const char*)> textEqual;
+    std::function<std::string(std::string)> stripSpaces;
+    std::function<bool(const CMPIObjectPath*, const CMPIObjectPath*, bool)> isObjPathsEqual;
+    std::function<void(CMPIData, CMPIInstance*, const char*, Orv::DataType, CMPIStatus*)> mapProperty;
+
+    std::vector<Monitoring> monitorings;
+};
+
+/** The script in force. */
+ORV_API Script& script();
+
+/** An empty script and an empty record. */
+ORV_API void reset();
+
+/** Empties the record only; cursors are numbered from 1 again. */
+ORV_API void clearRecord();
+
+/** Everything recorded so far. */
+ORV_API std::vector<std::string> record();
+
+/** The recorded lines that begin with `prefix`. */
+ORV_API std::vector<std::string> recorded(std::string_view prefix);
+
+/** Adds a line of the test's own, to show what happened between the agent's calls. */
+ORV_API void note(std::string line);
+
+/** Has the `nth` (from 1) call that begins with `call` run `failure`, which throws what it likes. */
+ORV_API void failAt(std::string call, int nth, std::function<void()> failure);
+
+} // namespace scripted_agent
