@@ -1,0 +1,36 @@
+#include "agent/hardware/Hardware.h"
+
+#include "agent/hardware/Devices.h"
+#include "agent/hardware/EthtoolIoctl.h"
+#include "agent/hardware/InventoryBuilder.h"
+#include "agent/hardware/Links.h"
+
+#include <linux/netlink.h>
+
+namespace Orv::Agent::Linux {
+
+std::optional<ParentDevice> describeDevice(const DeviceName& device, const std::string& sysRoot) {
+    return DeviceReader(sysRoot).describe(device);
+}
+
+std::optional<ParentDevice> findParentDevice(const std::string& interface, const std::string& sysRoot) {
+    const DeviceReader reader(sysRoot);
+    if (!sysRoot.empty()) {
+        return reader.describeOfInterface(interface);
+    }
+    NetlinkSocket socket(NETLINK_ROUTE);
+    const auto link = readLink(socket, interface);
+    return link ? deviceOf(*link, reader) : std::nullopt;
+}
+
+std::optional<std::vector<std::uint8_t>> readPermanentAddress(const std::string& interface) {
+    NetlinkSocket socket(NETLINK_ROUTE);
+    const auto link = readLink(socket, interface);
+    return link ? permanentAddressOf(*link, EthtoolIoctl()) : std::nullopt;
+}
+
+HardwareInventory readHardwareInventory() {
+    return buildInventory(readInterfaces());
+}
+
+} // namespace Orv::Agent::Linux
