@@ -4,7 +4,7 @@
 
 #include <linux/netlink.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 std::optional<Bytes> Attributes::find(std::uint16_t type) const {
     Bytes rest = _bytes;
@@ -36,4 +36,4 @@ Attributes Attributes::nested(std::uint16_t type) const {
     return Attributes(find(type).value_or(Bytes()));
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

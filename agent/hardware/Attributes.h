@@ -12,7 +12,7 @@
 #include <string>
 #include <type_traits>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 using Bytes = std::span<const std::byte>;
 
@@ -69,4 +69,4 @@ Attributes attributesBehind(Bytes payload) {
     return Attributes(payload.size() < sizeof(Header) ? Bytes() : payload.subspan(sizeof(Header)));
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

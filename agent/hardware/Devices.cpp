@@ -7,7 +7,7 @@
 
 #include <libudev.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -159,4 +159,4 @@ bool DeviceReader::isManagementController(const Path& parent, const Path& device
                                    [&](const HostInterface& interface) { return matches(interface, *identity); });
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -16,7 +16,10 @@
 
 struct udev;
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
+
+using Linux::DeviceName;
+using Linux::ParentDevice;
 
 /**
  * Reads descriptions of devices; what is the same for all of them is read once, when it is made. For one thread. With
@@ -26,7 +29,7 @@ class DeviceReader {
   public:
     explicit DeviceReader(std::string sysRoot = "");
 
-    /** As Linux::describeDevice does. */
+    /** As describeDevice does. */
     [[nodiscard]] std::optional<ParentDevice> describe(const DeviceName& device) const;
 
     /** The device that /sys/class/net names for an interface; none for a virtual one. */
@@ -53,4 +56,4 @@ class DeviceReader {
     std::vector<HostInterface> _hostInterfaces;
 };
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

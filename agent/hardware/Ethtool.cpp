@@ -7,7 +7,7 @@
 
 #include <linux/netlink.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -59,4 +59,4 @@ SettingsByIndex readLinkSettings(const std::vector<Link>& links) {
     return settings;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -10,7 +10,7 @@
 #include <unordered_map>
 #include <vector>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** Settings by interface index; interfaces whose driver has none are missing. */
 using SettingsByIndex = std::unordered_map<int, LinkSettings>;
@@ -22,4 +22,4 @@ using SettingsByIndex = std::unordered_map<int, LinkSettings>;
  */
 SettingsByIndex readLinkSettings(const std::vector<Link>& links);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

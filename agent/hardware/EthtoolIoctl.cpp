@@ -14,7 +14,7 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -100,4 +100,4 @@ bool EthtoolIoctl::request(const std::string& interface, void* command) const {
     return ioctl(_socket, SIOCETHTOOL, &question) == 0;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -14,7 +14,7 @@
 
 struct ethtool_link_settings;
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** Settings from a filled ETHTOOL_GLINKSETTINGS and its first bitmap. */
 LinkSettings settingsFrom(const ethtool_link_settings& settings, std::span<const std::uint32_t> supported);
@@ -40,4 +40,4 @@ class EthtoolIoctl {
     int _socket;
 };
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

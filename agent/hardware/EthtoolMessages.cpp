@@ -3,7 +3,7 @@
 #include <linux/ethtool_netlink.h>
 #include <linux/genetlink.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -99,4 +99,4 @@ std::optional<InterfaceSettings> parseLinkInfo(Bytes payload) {
     return result;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -12,7 +12,7 @@
 #include <cstdint>
 #include <optional>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** What one message tells of one interface; a field that the message does not have is none. */
 struct InterfaceSettings {
@@ -40,4 +40,4 @@ NetlinkRequest linkInfoRequest(std::uint16_t family);
 /** ETHTOOL_MSG_LINKINFO_GET_REPLY: the connector; none for other messages and without an index. */
 std::optional<InterfaceSettings> parseLinkInfo(Bytes payload);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

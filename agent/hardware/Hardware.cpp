@@ -10,27 +10,27 @@
 namespace Orv::Agent::Linux {
 
 std::optional<ParentDevice> describeDevice(const DeviceName& device, const std::string& sysRoot) {
-    return DeviceReader(sysRoot).describe(device);
+    return Hardware::DeviceReader(sysRoot).describe(device);
 }
 
 std::optional<ParentDevice> findParentDevice(const std::string& interface, const std::string& sysRoot) {
-    const DeviceReader reader(sysRoot);
+    const Hardware::DeviceReader reader(sysRoot);
     if (!sysRoot.empty()) {
         return reader.describeOfInterface(interface);
     }
-    NetlinkSocket socket(NETLINK_ROUTE);
-    const auto link = readLink(socket, interface);
-    return link ? deviceOf(*link, reader) : std::nullopt;
+    Hardware::NetlinkSocket socket(NETLINK_ROUTE);
+    const auto link = Hardware::readLink(socket, interface);
+    return link ? Hardware::deviceOf(*link, reader) : std::nullopt;
 }
 
 std::optional<std::vector<std::uint8_t>> readPermanentAddress(const std::string& interface) {
-    NetlinkSocket socket(NETLINK_ROUTE);
-    const auto link = readLink(socket, interface);
-    return link ? permanentAddressOf(*link, EthtoolIoctl()) : std::nullopt;
+    Hardware::NetlinkSocket socket(NETLINK_ROUTE);
+    const auto link = Hardware::readLink(socket, interface);
+    return link ? Hardware::permanentAddressOf(*link, Hardware::EthtoolIoctl()) : std::nullopt;
 }
 
 HardwareInventory readHardwareInventory() {
-    return buildInventory(readInterfaces());
+    return Hardware::buildInventory(Hardware::readInterfaces());
 }
 
 } // namespace Orv::Agent::Linux

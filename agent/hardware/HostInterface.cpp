@@ -6,7 +6,7 @@
 #include <fstream>
 #include <iterator>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -171,4 +171,4 @@ bool matches(const HostInterface& interface, const DeviceIdentity& device) {
             std::find(seen.begin(), seen.end(), interface.macAddress) != seen.end());
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -13,7 +13,7 @@
 #include <string>
 #include <vector>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 enum class DeviceBus { Usb, Pci };
 
@@ -52,4 +52,4 @@ std::vector<HostInterface> readHostInterfaces(const std::string& sysRoot);
 /** Whether the device is this interface: everything that both sides tell must agree. */
 bool matches(const HostInterface& interface, const DeviceIdentity& device);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

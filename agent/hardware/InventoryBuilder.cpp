@@ -12,7 +12,7 @@
 #include <linux/if_arp.h>
 #include <linux/netlink.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -202,4 +202,4 @@ std::vector<InterfaceFacts> readInterfaces() {
     return interfaces;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -14,7 +14,7 @@
 #include <optional>
 #include <vector>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** Everything that was read of one interface. */
 struct InterfaceFacts {
@@ -40,4 +40,4 @@ std::optional<std::vector<std::uint8_t>> permanentAddressOf(const Link& link, co
 /** Reads all interfaces of this process's network namespace. Throws std::system_error when links cannot be read. */
 std::vector<InterfaceFacts> readInterfaces();
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -4,7 +4,7 @@
 
 #include <linux/ethtool.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -140,4 +140,4 @@ std::optional<std::uint16_t> cimPortType(const LinkSettings& settings) {
     return type;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -9,7 +9,7 @@
 #include <span>
 #include <vector>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** Settings of a link as ethtool reports them; what the driver does not know is none. */
 struct LinkSettings {
@@ -41,4 +41,4 @@ std::optional<bool> canNegotiate(const LinkSettings& settings);
  */
 std::optional<std::uint16_t> cimPortType(const LinkSettings& settings);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -7,7 +7,7 @@
 #include <linux/if_link.h>
 #include <linux/rtnetlink.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -85,4 +85,4 @@ std::optional<Link> readLink(NetlinkSocket& socket, const std::string& name) {
     return link;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -13,7 +13,9 @@
 #include <string>
 #include <vector>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
+
+using Linux::DeviceName;
 
 /** One interface. Texts are the kernel's bytes. */
 struct Link {
@@ -38,4 +40,4 @@ std::vector<Link> readLinks(NetlinkSocket& socket);
 /** One link; none when there is no interface of this name. Throws std::system_error. */
 std::optional<Link> readLink(NetlinkSocket& socket, const std::string& name);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -6,7 +6,7 @@
 #include <sys/socket.h>
 #include <sys/time.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -86,4 +86,4 @@ NetlinkSocket::Progress NetlinkSocket::handle(const nlmsghdr& message, const Han
     return Progress::More;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -14,7 +14,7 @@
 
 #include <libmnl/libmnl.h>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** A request under construction: a netlink header, a fixed structure and attributes. */
 class NetlinkRequest {
@@ -88,4 +88,4 @@ auto dump(NetlinkSocket& socket, NetlinkRequest& request, const Parse& parse) {
     return items;
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -3,7 +3,7 @@
 #include <charconv>
 #include <fstream>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 namespace {
 
@@ -54,4 +54,4 @@ std::optional<std::string> readLinkName(const std::filesystem::path& link) {
     return target.filename().string();
 }
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware

@@ -9,7 +9,7 @@
 #include <optional>
 #include <string>
 
-namespace Orv::Agent::Linux {
+namespace Orv::Agent::Hardware {
 
 /** The first line of a file as it stands there, without surrounding blanks; none when unreadable or blank. */
 std::optional<std::string> readAttribute(const std::filesystem::path& file);
@@ -23,4 +23,4 @@ std::optional<std::uint16_t> readHexadecimal(const std::filesystem::path& file);
 /** The last name of a symbolic link's target: the driver, the subsystem; none when there is no such link. */
 std::optional<std::string> readLinkName(const std::filesystem::path& link);
 
-} // namespace Orv::Agent::Linux
+} // namespace Orv::Agent::Hardware
