@@ -7,6 +7,8 @@
 #ifndef ORV_AGENT_CONTROL_H
 #define ORV_AGENT_CONTROL_H
 
+#include "instrumentation/Export.h"
+
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -18,8 +20,11 @@ typedef void (*OrvAgentLogObserver)(int level, const char* logger, const char* m
  * Has every line of at least `level` that is given to the log (not the trace) shown to `observer`, whatever the
  * configured threshold; null ends it. One observer at a time. May be called from any thread; a call of the former
  * observer that is already under way on another thread may end after the function has returned.
+ *
+ * A line that the observer is shown is not written to the log's sink "stderr" as well: the process that owns that
+ * stream decides then what people read there, and would show it twice. All other sinks get it as ever.
  */
-void OrvAgent_observeLog(int level, OrvAgentLogObserver observer, void* context);
+ORV_API void OrvAgent_observeLog(int level, OrvAgentLogObserver observer, void* context);
 
 #ifdef __cplusplus
 }

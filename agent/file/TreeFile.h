@@ -1,6 +1,8 @@
 /**
  * @file
  * A simulated host: a TOML description of instrumentation nodes and of the network hardware.
+ *
+ * The format is described in docs/tree-file.md.
  */
 #pragma once
 
@@ -9,6 +11,7 @@
 
 #include <memory>
 #include <string>
+#include <string_view>
 
 namespace Orv::Agent {
 
@@ -25,5 +28,8 @@ struct TreeDescription {
  * value that does not belong; nothing is returned of a description that is wrong anywhere.
  */
 TreeDescription readTreeFile(const std::string& path);
+
+/** The same of a text that has been read already; `file` is how messages name it. */
+TreeDescription parseTreeDescription(std::string_view text, const std::string& file);
 
 } // namespace Orv::Agent

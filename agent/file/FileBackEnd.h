@@ -1,0 +1,21 @@
+/**
+ * @file
+ * The back end that is a description of a host.
+ */
+#pragma once
+
+#include "agent/tree/BackEnd.h"
+
+#include <memory>
+#include <string>
+
+namespace Orv::Agent {
+
+/**
+ * A back end over the description at `path` (see TreeFile.h). The file is first read for the first snapshot, and read
+ * again when it has changed. A snapshot throws std::runtime_error, as readTreeFile does, while the file is missing or
+ * wrong: an older state of it is never served in its place. Nodes cannot be written.
+ */
+std::unique_ptr<BackEnd> makeFileBackEnd(std::string path);
+
+} // namespace Orv::Agent

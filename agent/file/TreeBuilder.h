@@ -1,0 +1,53 @@
+/**
+ * @file
+ * Putting described nodes together to a tree.
+ */
+#pragma once
+
+#include "agent/tree/Tree.h"
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+namespace Orv::Agent {
+
+/** Where in the tree a described node belongs, and what it is. */
+struct DescribedNode {
+    NodeLexicon::NodeType type;
+    std::optional<std::string> identity;
+    std::optional<std::string> description; ///< the identity stands in for it
+    std::string chassis;                    ///< description of the grandparent
+    std::optional<std::string> device;      ///< description of the parent; none: a parent of its own
+    PropertyMap properties;                 ///< beside the identity
+};
+
+/** Builds host → chassis → device → node, with the devices and chassis that the nodes name. */
+class TreeBuilder {
+  public:
+    explicit TreeBuilder(std::string hostDescription);
+
+    /** Adds a node below its device; nodes are met in the order in which they were added. Returns its device's path.
+     */
+    std::string add(DescribedNode node);
+
+    /** Adds a node below a device that add has returned. */
+    void addBelow(const std::string& devicePath, DescribedNode node);
+
+    std::shared_ptr<const Tree> build();
+
+  private:
+    std::string chassisPath(const std::string& description);
+    std::string devicePath(const DescribedNode& node);
+    std::string newPath(char kind, const std::string& name);
+    void addNode(std::string path, std::string parentPath, std::string description);
+
+    std::vector<Tree::NodePointer> _nodes;
+    std::unordered_map<std::string, unsigned> _pathUses; ///< how many nodes have asked for a path
+    std::unordered_map<std::string, std::string> _chassis;
+    std::unordered_map<std::string, std::string> _devices; ///< by chassis path and description
+};
+
+} // namespace Orv::Agent

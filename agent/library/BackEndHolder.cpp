@@ -1,0 +1,52 @@
+#include "agent/library/BackEndHolder.h"
+
+#include "agent/config/Configuration.h"
+#include "agent/file/FileBackEnd.h"
+#include "agent/library/Log.h"
+#ifdef ORV_AGENT_LINUX
+#include "agent/linux/LinuxBackEnd.h"
+#endif
+
+#include <atomic>
+#include <mutex>
+#include <stdexcept>
+
+namespace Orv::Agent {
+
+namespace {
+
+std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
+    if (configuration.backEnd == Configuration::BackEndKind::File) {
+        return makeFileBackEnd(configuration.treeFile);
+    }
+#ifdef ORV_AGENT_LINUX
+    return Linux::makeLinuxBackEnd();
+#else
+    throw std::runtime_error("this agent has no back end for the host itself");
+#endif
+}
+
+} // namespace
+
+BackEnd& processBackEnd() {
+    static std::mutex mutex;
+    static std::atomic<BackEnd*> backEnd{nullptr};
+    if (BackEnd* present = backEnd.load(std::memory_order_acquire)) {
+        return *present;
+    }
+    const std::lock_guard lock(mutex);
+    if (BackEnd* present = backEnd.load(std::memory_order_acquire)) {
+        return *present;
+    }
+    const Configuration configuration = loadConfiguration();
+    Log::instance().configure(configuration);
+    BackEnd* made = makeBackEnd(configuration).release();
+    backEnd.store(made, std::memory_order_release);
+    return *made;
+}
+
+void reportFailure(const char* function, const char* text) noexcept {
+    Log::instance().log({function, "agent/library/BackEndHolder.cpp", __LINE__, "Hearth.Agent", 6000, text});
+}
+
+} // namespace Orv::Agent
