@@ -14,7 +14,21 @@
 
 namespace marlo {
 
-using Qualifiers = std::vector<NamedValue>;
+/** A qualifier of a class, property, method or parameter, with the flavors that are in force there (DSP0004 5.6.3).
+ */
+struct Qualifier {
+    std::string name;
+    Value value; ///< NULL of the qualifier's type where none is given
+    bool overridable = true;
+    bool toSubclass = true;
+    bool translatable = false;
+    bool propagated = false; ///< inherited, not given in the class itself
+};
+
+using Qualifiers = std::vector<Qualifier>;
+
+/** The qualifier of a name, or null. */
+const Qualifier* findQualifier(const Qualifiers& qualifiers, std::string_view name);
 
 /** A qualifier declaration. */
 struct QualifierType {
@@ -82,9 +96,12 @@ class Schema {
     Schema& operator=(Schema&&) noexcept;
 
     /**
-     * Reads the MOF files of a directory, in the order of their names. Declarations that precede any
-     * `#pragma namespace ("...")` of a file belong to every namespace; a class may come before its superclass.
-     * Throws std::runtime_error with file, line and reason for the first error; nothing of a wrong schema is served.
+     * Reads the MOF files (*.mof) of a directory, in the order of their names. Declarations that precede any
+     * `#pragma namespace ("...")` of a file belong to every namespace that some file names; a class may come before
+     * its superclass, a qualifier before its declaration. `#pragma include ("...")` reads a file beside the one that
+     * includes it, in the namespace then in force; a file is read once however often it is named.
+     * Throws std::runtime_error with file, line, column and reason for the first error; nothing of a wrong schema is
+     * served.
      */
     static Schema readDirectory(const std::string& directory);
 

@@ -1,0 +1,177 @@
+#include "host/schema/Schema.h"
+
+#include <map>
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace marlo::test {
+namespace {
+
+using testing::ElementsAre;
+
+/** The MOF that is installed. */
+class ShippedSchema : public testing::Test {
+  protected:
+    static void SetUpTestSuite() { schema() = Schema::readDirectory(MARLO_SHIPPED_SCHEMA); }
+
+    static Schema& schema() {
+        static Schema shipped;
+        return shipped;
+    }
+
+    static const Class& find(const std::string& nameSpace, const std::string& name) {
+        const Class* const found = schema().findClass(nameSpace, name);
+        if (found == nullptr) {
+            throw std::runtime_error(name + " is not in " + nameSpace);
+        }
+        return *found;
+    }
+
+    static std::map<std::string, CMPIType> typesOf(const Class& of) {
+        std::map<std::string, CMPIType> types;
+        for (const Property& property : of.properties) {
+            types[property.name] = property.type;
+        }
+        return types;
+    }
+
+    static std::vector<std::string> keysOf(const Class& of) {
+        std::vector<std::string> names;
+        for (const Property* key : of.keys()) {
+            names.push_back(key->name);
+        }
+        return names;
+    }
+
+    static void expectTypes(const Class& of, const std::map<std::string, CMPIType>& expected) {
+        const auto types = typesOf(of);
+        for (const auto& [name, type] : expected) {
+            const auto found = types.find(name);
+            ASSERT_NE(found, types.end()) << of.name << "." << name;
+            EXPECT_EQ(found->second, type) << of.name << "." << name;
+        }
+    }
+};
+
+const std::map<std::string, CMPIType> CardTypes = {
+    {"CreationClassName", CMPI_string}, {"Status", CMPI_string}, {"ElementName", CMPI_string},
+    {"Description", CMPI_string},       {"Name", CMPI_string},   {"SerialNumber", CMPI_string},
+    {"PackageType", CMPI_uint16},       {"Tag", CMPI_string}};
+
+const std::map<std::string, CMPIType> PortTypes = {{"CreationClassName", CMPI_string},
+                                                   {"SystemCreationClassName", CMPI_string},
+                                                   {"Status", CMPI_string},
+                                                   {"SystemName", CMPI_string},
+                                                   {"DeviceID", CMPI_string},
+                                                   {"ElementName", CMPI_string},
+                                                   {"Caption", CMPI_string},
+                                                   {"Description", CMPI_string},
+                                                   {"Name", CMPI_string},
+                                                   {"Speed", CMPI_uint64},
+                                                   {"MaxSpeed", CMPI_uint64},
+                                                   {"RequestedSpeed", CMPI_uint64},
+                                                   {"PortType", CMPI_uint16},
+                                                   {"PortNumber", CMPI_uint16},
+                                                   {"PermanentAddress", CMPI_string},
+                                                   {"FullDuplex", CMPI_boolean},
+                                                   {"AutoSense", CMPI_boolean},
+                                                   {"LinkTechnology", CMPI_uint16}};
+
+TEST_F(ShippedSchema, HasItsTwoNamespaces) {
+    EXPECT_THAT(schema().nameSpaces(), ElementsAre("root/tavis", "root/quarn"));
+}
+
+TEST_F(ShippedSchema, GivesThePhysicalAdapterItsPropertiesAndKeys) {
+    const Class& adapter = find("root/tavis", "MARLO_PhysicalNetworkAdapter");
+    expectTypes(adapter, CardTypes);
+    EXPECT_THAT(keysOf(adapter), ElementsAre("Tag", "CreationClassName"));
+    EXPECT_TRUE(schema().isA("root/tavis", adapter.name, "CIM_PhysicalPackage"));
+}
+
+TEST_F(ShippedSchema, GivesTheLogicalAdapterItsPropertiesAndKeys) {
+    const Class& adapter = find("root/tavis", "MARLO_LogicalNetworkAdapter");
+    expectTypes(adapter, PortTypes);
+    EXPECT_EQ(adapter.properties.size(), PortTypes.size());
+    EXPECT_THAT(keysOf(adapter),
+                ElementsAre("SystemCreationClassName", "SystemName", "CreationClassName", "DeviceID"));
+    EXPECT_TRUE(schema().isA("root/tavis", adapter.name, "CIM_NetworkPort"));
+}
+
+TEST_F(ShippedSchema, GivesTheConfigurationItsPropertiesAndKey) {
+    const Class& configuration = find("root/tavis", "MARLO_NetworkAdapterConfiguration");
+    expectTypes(configuration, {{"SettingID", CMPI_string},
+                                {"Description", CMPI_string},
+                                {"IPAddress", CMPI_stringA},
+                                {"IPSubnet", CMPI_stringA},
+                                {"DNSHostName", CMPI_string},
+                                {"DNSDomain", CMPI_string},
+                                {"MACAddress", CMPI_string},
+                                {"DHCPEnabled", CMPI_boolean},
+                                {"IPEnabled", CMPI_boolean},
+                                {"DNSDomainSuffixSearchOrder", CMPI_stringA},
+                                {"DefaultIPGateway", CMPI_stringA},
+                                {"DNSServerSearchOrder", CMPI_stringA}});
+    EXPECT_THAT(keysOf(configuration), ElementsAre("SettingID"));
+    EXPECT_TRUE(schema().isA("root/tavis", configuration.name, "CIM_ManagedElement"));
+}
+
+TEST_F(ShippedSchema, GivesThePlatformsClassesWhatIsReadOfThem) {
+    const Class& card = find("root/quarn", "TAVIS_NetworkCard");
+    expectTypes(card, CardTypes);
+    EXPECT_THAT(keysOf(card), ElementsAre("Tag", "CreationClassName"));
+    const Class& port = find("root/quarn", "TAVIS_NetworkPort");
+    expectTypes(port, PortTypes);
+    EXPECT_THAT(keysOf(port), ElementsAre("SystemCreationClassName", "SystemName", "CreationClassName", "DeviceID"));
+}
+
+TEST_F(ShippedSchema, KeepsTheNamespacesApart) {
+    EXPECT_EQ(schema().findClass("root/quarn", "MARLO_PhysicalNetworkAdapter"), nullptr);
+    EXPECT_EQ(schema().findClass("root/tavis", "TAVIS_NetworkCard"), nullptr);
+}
+
+TEST_F(ShippedSchema, DerivesEverythingFromTheStandardsRootAndServesNoAbstractClass) {
+    for (const std::string& nameSpace : schema().nameSpaces()) {
+        for (const Class* each : schema().classes(nameSpace)) {
+            EXPECT_TRUE(schema().isA(nameSpace, each->name, "CIM_ManagedElement")) << each->name;
+            const bool isOurs = !each->name.starts_with("CIM_");
+            EXPECT_FALSE(isOurs && each->isAbstract) << each->name;
+            EXPECT_FALSE(isOurs && each->keys().empty()) << each->name;
+        }
+    }
+}
+
+TEST_F(ShippedSchema, DescribesEveryClassAndProperty) {
+    for (const std::string& nameSpace : schema().nameSpaces()) {
+        for (const Class* each : schema().classes(nameSpace)) {
+            EXPECT_NE(findQualifier(each->qualifiers, "Description"), nullptr) << each->name;
+            EXPECT_NE(findQualifier(each->qualifiers, "Version"), nullptr) << each->name;
+            for (const Property& property : each->properties) {
+                const Qualifier* const description = findQualifier(property.qualifiers, "Description");
+                ASSERT_NE(description, nullptr) << each->name << "." << property.name;
+                EXPECT_FALSE(description->value.isNull()) << each->name << "." << property.name;
+            }
+        }
+    }
+}
+
+TEST_F(ShippedSchema, PairsEveryValueWithItsMeaning) {
+    for (const std::string& nameSpace : schema().nameSpaces()) {
+        for (const Class* each : schema().classes(nameSpace)) {
+            for (const Property& property : each->properties) {
+                const Qualifier* const map = findQualifier(property.qualifiers, "ValueMap");
+                const Qualifier* const values = findQualifier(property.qualifiers, "Values");
+                if (map != nullptr && values != nullptr) {
+                    EXPECT_EQ(std::get<Value::Array>(map->value.data).size(),
+                              std::get<Value::Array>(values->value.data).size())
+                        << each->name << "." << property.name;
+                }
+            }
+        }
+    }
+}
+
+} // namespace
+} // namespace marlo::test
