@@ -22,7 +22,8 @@ struct DeviceCloser {
  * several functions.
  */
 Path cardOf(const Path& parent) {
-    const bool usbFunction = std::filesystem::exists(parent / "bInterfaceNumber");
+    std::error_code error;
+    const bool usbFunction = std::filesystem::exists(parent / "bInterfaceNumber", error);
     return usbFunction ? parent.parent_path() : parent;
 }
 

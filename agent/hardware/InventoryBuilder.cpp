@@ -141,7 +141,8 @@ InterfaceFacts readFacts(Link link, SettingsByIndex& settings, const DeviceReade
         const auto directory = reader.interfaceDirectory(facts.link.name);
         if (isShown(facts.link, directory)) {
             facts.portNumber = readNumber(directory / "dev_port");
-            facts.wireless = std::filesystem::exists(directory / "phy80211");
+            std::error_code error;
+            facts.wireless = std::filesystem::exists(directory / "phy80211", error);
         }
     }
     return facts;
