@@ -45,7 +45,7 @@ std::string char16Text(char16_t c) {
     return text + '\'';
 }
 
-struct KeyText {
+struct ValueText {
     std::string operator()(std::monostate) const { return "NULL"; }
 
     std::string operator()(bool value) const { return value ? "TRUE" : "FALSE"; }
@@ -73,7 +73,7 @@ struct KeyText {
     std::string operator()(const Value::Array& value) const {
         std::string text = "{";
         for (const Value& element : value) {
-            text += (text.size() > 1 ? "," : "") + std::visit(KeyText{}, element.data);
+            text += (text.size() > 1 ? "," : "") + toText(element);
         }
         return text + '}';
     }
@@ -307,6 +307,10 @@ class PathReader {
 
 } // namespace
 
+std::string toText(const Value& value) {
+    return std::visit(ValueText{}, value.data);
+}
+
 std::string ObjectPath::toString() const {
     std::string text;
     if (!host.empty()) {
@@ -318,7 +322,7 @@ std::string ObjectPath::toString() const {
     text += className;
     char separator = '.';
     for (const NamedValue& key : keys) {
-        text += separator + key.name + '=' + std::visit(KeyText{}, key.value.data);
+        text += separator + key.name + '=' + toText(key.value);
         separator = ',';
     }
     return text;

@@ -57,4 +57,7 @@ struct Value {
 /** The CIM name of a type ("uint16", "string", "datetime", ...), without array brackets; "" for codes CIM has not. */
 std::string typeName(CMPIType type);
 
+/** A value as it stands in the text of an object path: texts quoted, arrays in braces, NULL as such. */
+std::string toText(const Value& value);
+
 } // namespace marlo

@@ -1,0 +1,144 @@
+#include "host/broker/Arena.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+
+namespace marlo::broker {
+
+namespace {
+
+constexpr std::size_t callBlock = 4096;
+constexpr std::size_t sharedBlock = 512;
+constexpr std::size_t largestBlock = std::size_t{64} * 1024;
+constexpr std::size_t alignment = alignof(std::max_align_t);
+
+constexpr std::size_t aligned(std::size_t bytes) {
+    return (bytes + alignment - 1) / alignment * alignment;
+}
+
+} // namespace
+
+struct alignas(alignment) Arena::Block {
+    Block* next;
+};
+
+Arena::Arena(Use use) : _own{.nextSize = callBlock}, _shared{.nextSize = sharedBlock} {
+    if (use == Use::call) {
+        _owner = std::this_thread::get_id();
+    }
+}
+
+Arena::~Arena() {
+    release(_own);
+    release(_shared);
+    for (void* piece : _pieces) {
+        std::free(piece);
+    }
+}
+
+void Arena::release(Part& part) {
+    while (part.blocks != nullptr) {
+        Block* next = part.blocks->next;
+        std::free(part.blocks);
+        part.blocks = next;
+    }
+}
+
+void* Arena::allocate(std::size_t bytes) {
+    if (isOwner()) {
+        return allocate(_own, bytes);
+    }
+    const std::lock_guard lock(_mutex);
+    return allocate(_shared, bytes);
+}
+
+void* Arena::allocate(Part& part, std::size_t bytes) {
+    const std::size_t taken = aligned(bytes);
+    if (taken < bytes) {
+        throw std::bad_alloc();
+    }
+    if (taken > static_cast<std::size_t>(part.end - part.at)) {
+        return allocateBlock(part, taken);
+    }
+    void* memory = part.at;
+    part.at += taken;
+    return memory;
+}
+
+/** Starts a new block, or gives a large request a block of its own and goes on with the one that is open. */
+void* Arena::allocateBlock(Part& part, std::size_t bytes) {
+    const bool large = bytes > part.nextSize / 2;
+    const std::size_t room = large ? bytes : part.nextSize - sizeof(Block);
+    auto* block = static_cast<Block*>(std::malloc(sizeof(Block) + room));
+    if (block == nullptr) {
+        throw std::bad_alloc();
+    }
+    block->next = part.blocks;
+    part.blocks = block;
+    auto* memory = reinterpret_cast<std::byte*>(block + 1);
+    if (!large) {
+        part.at = memory + bytes;
+        part.end = memory + room;
+        part.nextSize = std::min(part.nextSize * 2, largestBlock);
+    }
+    return memory;
+}
+
+const char* Arena::copy(std::string_view text) {
+    auto* copied = static_cast<char*>(allocate(text.size() + 1));
+    std::copy(text.begin(), text.end(), copied);
+    copied[text.size()] = '\0';
+    return copied;
+}
+
+StringObject** Arena::nameCache() {
+    if (!isOwner()) {
+        return nullptr;
+    }
+    if (_names == nullptr) {
+        _names = makeArray<StringObject*>(nameCacheSize);
+    }
+    return _names;
+}
+
+void* Arena::allocatePiece(std::size_t bytes, bool zeroed) {
+    // malloc(0) may be null, which would look like a failure.
+    void* piece =
+        zeroed ? std::calloc(1, std::max<std::size_t>(bytes, 1)) : std::malloc(std::max<std::size_t>(bytes, 1));
+    if (piece != nullptr) {
+        const std::lock_guard lock(_mutex);
+        _pieces.insert(piece);
+    }
+    return piece;
+}
+
+void* Arena::resizePiece(void* piece, std::size_t bytes) {
+    const std::lock_guard lock(_mutex);
+    const auto found = _pieces.find(piece);
+    if (found == _pieces.end()) {
+        return nullptr;
+    }
+    void* resized = std::realloc(piece, std::max<std::size_t>(bytes, 1));
+    if (resized != nullptr && resized != piece) {
+        _pieces.erase(found);
+        _pieces.insert(resized);
+    }
+    return resized;
+}
+
+bool Arena::freePiece(void* piece) {
+    const std::lock_guard lock(_mutex);
+    if (_pieces.erase(piece) == 0) {
+        return false;
+    }
+    std::free(piece);
+    return true;
+}
+
+bool Arena::ownsPiece(const void* piece) {
+    const std::lock_guard lock(_mutex);
+    return _pieces.count(const_cast<void*>(piece)) != 0;
+}
+
+} // namespace marlo::broker

@@ -1,0 +1,101 @@
+/**
+ * @file
+ * Memory that is released as a whole: that of one call, or of one clone.
+ */
+#pragma once
+
+#include <cstddef>
+#include <memory>
+#include <mutex>
+#include <new>
+#include <string_view>
+#include <thread>
+#include <type_traits>
+#include <unordered_set>
+#include <utility>
+
+namespace marlo::broker {
+
+class StringObject;
+
+/**
+ * Hands out memory from growing blocks and releases all of it at once. What lies in it is never destroyed one by one,
+ * so it must be trivially destructible.
+ *
+ * The thread that a call runs on allocates without locking. An object may be changed by another thread than the one
+ * whose call owns it; what that takes comes from a part of its own, under a lock.
+ */
+class Arena {
+  public:
+    /** Who allocates: mostly the constructing thread (calls), or now this, now that thread (clones). */
+    enum class Use { call, clone };
+
+    explicit Arena(Use use);
+    ~Arena();
+    Arena(const Arena&) = delete;
+    Arena& operator=(const Arena&) = delete;
+
+    /** Uninitialised memory, aligned for anything. Throws std::bad_alloc. */
+    void* allocate(std::size_t bytes);
+
+    template <typename T, typename... Arguments>
+    T* make(Arguments&&... arguments) {
+        static_assert(std::is_trivially_destructible_v<T>);
+        return ::new (allocate(sizeof(T))) T(std::forward<Arguments>(arguments)...);
+    }
+
+    template <typename T>
+    T* makeArray(std::size_t count) {
+        static_assert(std::is_trivially_destructible_v<T>);
+        T* array = static_cast<T*>(allocate(count * sizeof(T)));
+        std::uninitialized_value_construct_n(array, count);
+        return array;
+    }
+
+    /** A zero-terminated copy. */
+    const char* copy(std::string_view text);
+
+    /** Strings by which names that recur in this arena are found again; null when the caller may not use it. */
+    StringObject** nameCache();
+
+    static constexpr std::size_t nameCacheSize = 64; ///< a power of two
+
+    /** The object whose release ends this arena; null for the arena of a call, whose objects end with the call. */
+    [[nodiscard]] const void* root() const { return _root; }
+
+    void setRoot(const void* root) { _root = root; }
+
+    /** Single pieces of memory that may be freed or resized before the arena ends; null where memory is out. */
+    void* allocatePiece(std::size_t bytes, bool zeroed);
+    /** Null also when the piece is not of this arena (or was freed): nothing is done then. */
+    void* resizePiece(void* piece, std::size_t bytes);
+    /** False when the piece is not of this arena. */
+    bool freePiece(void* piece);
+    [[nodiscard]] bool ownsPiece(const void* piece);
+
+  private:
+    struct Block;
+
+    struct Part {
+        Block* blocks = nullptr;
+        std::byte* at = nullptr;
+        std::byte* end = nullptr;
+        std::size_t nextSize;
+    };
+
+    [[nodiscard]] bool isOwner() const { return _owner == std::this_thread::get_id(); }
+
+    static void* allocate(Part& part, std::size_t bytes);
+    static void* allocateBlock(Part& part, std::size_t bytes);
+    static void release(Part& part);
+
+    std::thread::id _owner;
+    Part _own;
+    Part _shared;
+    std::mutex _mutex; ///< guards _shared and _pieces
+    std::unordered_set<void*> _pieces;
+    StringObject** _names = nullptr;
+    const void* _root = nullptr;
+};
+
+} // namespace marlo::broker
