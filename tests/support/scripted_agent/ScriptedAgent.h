@@ -31,12 +31,12 @@ namespace scripted_agent {
 /** A node has exactly the properties that are named here. */
 struct Node {
     Orv::NodeLexicon::NodeType type = Orv::NodeLexicon::NODE_NETWORK_ADAPTER;
-    std::string path;
-    std::string parent; ///< path of the parent
-    std::string description;
-    std::map<Orv::NodeLexicon::Properties, std::string> texts;
-    std::map<Orv::NodeLexicon::Properties, unsigned int> numbers;
-    std::map<Orv::NodeLexicon::Properties, std::vector<std::string>> lists;
+    std::string path{};
+    std::string parent{}; ///< path of the parent
+    std::string description{};
+    std::map<Orv::NodeLexicon::Properties, std::string> texts{};
+    std::map<Orv::NodeLexicon::Properties, unsigned int> numbers{};
+    std::map<Orv::NodeLexicon::Properties, std::vector<std::string>> lists{};
 };
 
 /** A monitoring that was started and not stopped. */
