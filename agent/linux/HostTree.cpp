@@ -1,0 +1,158 @@
+#include "agent/linux/HostTree.h"
+
+#include "agent/linux/AdapterNode.h"
+#include "agent/linux/Selection.h"
+#include "agent/text/Text.h"
+
+#include <exception>
+#include <utility>
+
+namespace Orv::Agent::Linux {
+
+namespace {
+
+constexpr const char* hostPath = "/host";
+constexpr const char* chassisPath = "/host/chassis";
+constexpr const char* controllerPath = "/host/bmc";
+constexpr const char* controllerDescription = "BMC";
+
+/** The known node when it equals the fresh one, so that trees share it; else the fresh one. */
+Tree::NodePointer keep(const Tree::NodePointer& known, Node fresh) {
+    return known && *known == fresh ? known : std::make_shared<const Node>(std::move(fresh));
+}
+
+std::string describe(const ParentDevice& device) {
+    std::string text = device.vendor.value_or("");
+    if (device.model) {
+        text += (text.empty() ? "" : " ") + *device.model;
+    }
+    return text.empty() ? device.driver.value_or(device.subsystem) : text;
+}
+
+/** What `question` answers; nothing when it throws: hardware that cannot be asked must not hide the interface. */
+template <typename Question>
+auto ask(const Question& question) -> decltype(question()) {
+    try {
+        return question();
+    } catch (const std::exception&) {
+        return std::nullopt;
+    }
+}
+
+} // namespace
+
+std::shared_ptr<const Tree> HostTree::update(const KernelState& state, const HostConfiguration& configuration,
+                                             const std::set<int>& changed) {
+    for (const int index : changed) {
+        const auto link = state.links().find(index);
+        if (link == state.links().end() || isLoopback(link->second)) {
+            _interfaces.erase(index);
+        } else {
+            updateInterface(link->second, state, configuration);
+        }
+    }
+    return assemble(configuration.hostName());
+}
+
+void HostTree::updateInterface(const Link& link, const KernelState& state, const HostConfiguration& configuration) {
+    Interface& interface = _interfaces[link.index];
+    identify(link, interface);
+    const std::string name = cleanText(link.name);
+    const std::string suffix = '/' + std::to_string(link.index);
+    interface.adapter =
+        keep(interface.adapter,
+             {interface.device.path + "/adapter" + suffix, interface.device.path, NodeLexicon::NODE_NETWORK_ADAPTER,
+              name, adapterProperties(link, interface.permanentAddress, state, configuration)});
+    if (!interface.device.isReal) {
+        interface.port = nullptr;
+        return;
+    }
+    PropertyMap properties{{NodeLexicon::PROP_NODE_STRING, name}};
+    const auto& address = interface.permanentAddress.empty() ? link.address : interface.permanentAddress;
+    if (auto text = hardwareAddressText(address)) {
+        properties.emplace(NodeLexicon::PROP_MAC_ADDRESS, std::move(*text));
+    }
+    interface.port = keep(interface.port, {interface.device.path + "/port" + suffix, interface.device.path,
+                                           NodeLexicon::NODE_NETWORK_PORT, name, std::move(properties)});
+}
+
+/** Looks up the hardware, which is dear, only for an interface that is new or has become another. */
+void HostTree::identify(const Link& link, Interface& interface) {
+    const Link& known = interface.link;
+    // A new name counts, because udev renames an interface when its own data about the device are complete.
+    const bool same = known.index == link.index && known.name == link.name && known.kind == link.kind &&
+                      known.parentName == link.parentName && known.parentBus == link.parentBus &&
+                      known.permanentAddress == link.permanentAddress;
+    if (same) {
+        return;
+    }
+    interface.device = deviceOf(link);
+    interface.permanentAddress = link.permanentAddress;
+    if (interface.device.isReal && link.permanentAddress.empty()) {
+        interface.permanentAddress =
+            ask([&] { return _hardware.permanentAddress(link.name); }).value_or(std::vector<std::uint8_t>());
+    }
+    interface.link = link;
+}
+
+std::optional<ParentDevice> HostTree::parentOf(const Link& link) const {
+    if (!link.parentName.empty()) {
+        return ask([&] { return _hardware.describe({link.parentBus, link.parentName}); });
+    }
+    // A link without kind and without parent is a rare thing on a kernel that names parents, and every piece of
+    // hardware on one that does not (before 5.14).
+    return link.kind.empty() ? ask([&] { return _hardware.find(link.name); }) : std::nullopt;
+}
+
+HostTree::Device HostTree::deviceOf(const Link& link) const {
+    if (const auto parent = parentOf(link)) {
+        const char* above = parent->managementController ? controllerPath : chassisPath;
+        return {above + parent->syspath, describe(*parent), true, parent->managementController};
+    }
+    if (!link.parentName.empty()) {
+        const std::string name = cleanText(link.parentBus + ' ' + link.parentName);
+        return {std::string(chassisPath) + "/device/" + name, name, true, false};
+    }
+    const std::string kind = link.kind.empty() ? "virtual" : cleanText(link.kind);
+    return {std::string(chassisPath) + "/virtual/" + kind, kind, false, false};
+}
+
+/** Host, chassis and the devices that carry something; those of the last tree are shared or forgotten. */
+std::vector<Tree::NodePointer> HostTree::structure(const std::string& hostName) {
+    std::map<std::string, NodePointer> fresh;
+    std::vector<NodePointer> nodes;
+    const auto add = [&](const std::string& path, const std::string& parent, const std::string& description) {
+        const auto [place, isNew] = fresh.try_emplace(path);
+        if (isNew) {
+            const auto known = _structure.find(path);
+            place->second = keep(known == _structure.end() ? nullptr : known->second,
+                                 {path, parent, std::nullopt, description, {}});
+            nodes.push_back(place->second);
+        }
+    };
+    add(hostPath, "", hostName);
+    add(chassisPath, hostPath, "Chassis");
+    for (const auto& [index, interface] : _interfaces) {
+        const Device& device = interface.device;
+        if (device.managementController) {
+            add(controllerPath, hostPath, controllerDescription);
+        }
+        add(device.path, device.managementController ? controllerPath : chassisPath, device.description);
+    }
+    _structure = std::move(fresh);
+    return nodes;
+}
+
+std::shared_ptr<const Tree> HostTree::assemble(const std::string& hostName) {
+    std::vector<NodePointer> nodes = structure(hostName);
+    nodes.reserve(nodes.size() + 2 * _interfaces.size());
+    for (const auto& [index, interface] : _interfaces) {
+        nodes.push_back(interface.adapter);
+        if (interface.port) {
+            nodes.push_back(interface.port);
+        }
+    }
+    return std::make_shared<const Tree>(std::move(nodes));
+}
+
+} // namespace Orv::Agent::Linux
