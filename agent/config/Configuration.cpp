@@ -36,12 +36,12 @@ std::optional<Configuration::BackEndKind> backEndOf(std::string_view name) {
     return name == "file" ? std::optional(Configuration::BackEndKind::File) : std::nullopt;
 }
 
-void readChannel(TomlReader& file, const std::string& path, const std::string& name, ChannelConfiguration& channel) {
+void readChannel(TomlReader& file, const std::string& path, std::string_view name, ChannelConfiguration& channel) {
     toml::table* table = file.table(name);
     if (table == nullptr) {
         return;
     }
-    const std::string prefix = name + ".";
+    const std::string prefix = std::string(name) + ".";
     TomlReader reader(*table, path, prefix);
     channel.level = static_cast<int>(reader.integer("level", highestLevel).value_or(channel.level));
     channel.sinks = reader.texts("sinks").value_or(channel.sinks);

@@ -31,7 +31,10 @@ toml::table parseToml(std::string_view text, const std::string& file);
  */
 class TomlReader {
   public:
-    /** `prefix` stands before the table's keys in messages: "adapter." or nothing. All three must outlive this. */
+    /**
+     * `prefix` stands before the table's keys in messages: "adapter." or nothing. All three must outlive this, and
+     * so must every key that is asked for.
+     */
     TomlReader(toml::table& table, const std::string& file, const std::string& prefix)
         : _table(table), _file(file), _prefix(prefix) {}
 

@@ -1,0 +1,189 @@
+#include "agent/file/FileBackEnd.h"
+#include "tests/agent/TemporaryFile.h"
+
+#include <atomic>
+#include <thread>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using namespace Orv::NodeLexicon;
+using Orv::Agent::BackEnd;
+using Orv::Agent::makeFileBackEnd;
+using Orv::Agent::PropertyValue;
+using Orv::Agent::Tree;
+using Orv::Test::messageOf;
+using Orv::Test::TemporaryFile;
+
+std::string adapters(const std::string& identity, int count = 1) {
+    std::string text;
+    for (int i = 0; i < count; ++i) {
+        text += "[[adapter]]\nidentity = \"" + identity + "\"\n";
+    }
+    return text;
+}
+
+std::string firstIdentity(const Tree& tree) {
+    return tree.nodesOfType(NODE_NETWORK_ADAPTER).at(0)->description;
+}
+
+struct FileBackEndTest : testing::Test {
+    std::string identityNow() { return firstIdentity(*backEnd->snapshot()); }
+
+    std::string failure() {
+        return messageOf([&] { backEnd->snapshot(); });
+    }
+
+    TemporaryFile file{"lab.toml", adapters("eth0")};
+    std::unique_ptr<BackEnd> backEnd = makeFileBackEnd(file.path());
+};
+
+TEST_F(FileBackEndTest, GivesTheSameTreeWhileTheFileIsTheSame) {
+    file.age();
+    const auto first = backEnd->snapshot();
+    EXPECT_EQ(backEnd->snapshot(), first);
+    EXPECT_EQ(backEnd->snapshot(), first);
+}
+
+TEST_F(FileBackEndTest, GivesTheSameTreeWhileAFileWrittenJustNowIsTheSame) {
+    const auto first = backEnd->snapshot();
+    EXPECT_EQ(backEnd->snapshot(), first);
+}
+
+TEST_F(FileBackEndTest, SeesAFileWrittenInPlace) {
+    EXPECT_EQ(identityNow(), "eth0");
+    file.write(adapters("eth17"));
+    EXPECT_EQ(identityNow(), "eth17");
+}
+
+TEST_F(FileBackEndTest, SeesEveryOneOfManyQuickWritesOfOneLength) {
+    // All within one step of the kernel's file clock: neither the time nor the size tells them apart.
+    for (int i = 0; i < 200; ++i) {
+        const std::string identity = "eth" + std::to_string(100 + i);
+        file.write(adapters(identity));
+        ASSERT_EQ(identityNow(), identity);
+    }
+}
+
+TEST_F(FileBackEndTest, SeesAFileRenamedOntoItWithTheOldTime) {
+    file.age();
+    EXPECT_EQ(identityNow(), "eth0");
+    const auto time = std::filesystem::last_write_time(file.path());
+    file.replace(adapters("eth1"));
+    std::filesystem::last_write_time(file.path(), time);
+    EXPECT_EQ(identityNow(), "eth1");
+}
+
+TEST_F(FileBackEndTest, KeepsATreeThatACursorHolds) {
+    const auto held = backEnd->snapshot();
+    file.write(adapters("eth1"));
+    EXPECT_EQ(identityNow(), "eth1");
+    EXPECT_EQ(firstIdentity(*held), "eth0");
+}
+
+TEST_F(FileBackEndTest, FailsWhenTheFileVanishesAndServesItAgainWhenItIsBack) {
+    EXPECT_EQ(identityNow(), "eth0");
+    file.remove();
+    EXPECT_EQ(failure(), file.path() + ": cannot be read: No such file or directory");
+    file.write(adapters("eth2"));
+    EXPECT_EQ(identityNow(), "eth2");
+}
+
+TEST_F(FileBackEndTest, FailsWhileTheFileIsWrongAndServesNothingOfItsFormerState) {
+    EXPECT_EQ(identityNow(), "eth0");
+    file.write("[[adapter]]\nstatus = \"up\"\n");
+    const std::string message =
+        file.path() + ":2: adapter.status: expected an integer from 0 to 4294967295, found a string";
+    EXPECT_EQ(failure(), message);
+    EXPECT_EQ(failure(), message);
+    file.write(adapters("eth0"));
+    EXPECT_EQ(identityNow(), "eth0");
+}
+
+TEST_F(FileBackEndTest, FailsAgainThoughTheWrongFileLooksUnchanged) {
+    file.write("[[adapter]]\nstatus = \"up\"\n");
+    file.age();
+    EXPECT_NE(failure(), "nothing was thrown");
+    EXPECT_NE(failure(), "nothing was thrown");
+}
+
+TEST_F(FileBackEndTest, NeedsNoFileUntilItIsAsked) {
+    const auto early = makeFileBackEnd((file.directory() / "later.toml").string());
+    EXPECT_THAT(messageOf([&] { early->snapshot(); }), testing::HasSubstr("later.toml: cannot be read"));
+}
+
+struct RefusedWrite {
+    PropertyValue value;
+    const char* text;
+};
+
+TEST_F(FileBackEndTest, RefusesAWriteNamingNodePropertyValueAndCause) {
+    const std::string path = backEnd->snapshot()->nodesOfType(NODE_NETWORK_ADAPTER)[0]->path;
+    const RefusedWrite writes[] = {{7U, "7"},
+                                   {std::string("192.0.2.1"), "\"192.0.2.1\""},
+                                   {std::vector<std::string>{"a", "b"}, "[\"a\", \"b\"]"}};
+    for (const auto& [value, text] : writes) {
+        EXPECT_EQ(messageOf([&] { backEnd->setProperty(path, PROP_IPV4_ADDRESS, value); }),
+                  "eth0: property 25 cannot be set to " + std::string(text) + ": the tree file " + file.path() +
+                      " is only read");
+    }
+    EXPECT_EQ(file.read(), adapters("eth0"));
+}
+
+TEST_F(FileBackEndTest, NeverShowsHalfAFileThatIsReplacedWhileItIsRead) {
+    constexpr int count = 300;
+    file.replace(adapters("old", count));
+    std::atomic<bool> isDone{false};
+    std::thread writer([&] {
+        for (int i = 0; i < 60; ++i) {
+            file.replace(adapters(i % 2 == 0 ? "new" : "older", count));
+        }
+        isDone = true;
+    });
+    while (!isDone) {
+        const auto tree = backEnd->snapshot();
+        const auto& nodes = tree->nodesOfType(NODE_NETWORK_ADAPTER);
+        ASSERT_EQ(nodes.size(), static_cast<std::size_t>(count));
+        EXPECT_EQ(nodes.front()->description, nodes.back()->description);
+    }
+    writer.join();
+    EXPECT_EQ(identityNow(), "older");
+}
+
+TEST_F(FileBackEndTest, ServesManyThreadsWhileTheFileChanges) {
+    std::atomic<bool> isDone{false};
+    std::atomic<int> wrong{0};
+    std::vector<std::thread> readers;
+    for (int i = 0; i < 4; ++i) {
+        readers.emplace_back([&] {
+            while (!isDone) {
+                wrong += firstIdentity(*backEnd->snapshot()).starts_with("eth") ? 0 : 1;
+            }
+        });
+    }
+    for (int i = 0; i < 50; ++i) {
+        file.replace(adapters("eth" + std::to_string(i)));
+    }
+    isDone = true;
+    for (auto& reader : readers) {
+        reader.join();
+    }
+    EXPECT_EQ(wrong, 0);
+    EXPECT_EQ(identityNow(), "eth49");
+}
+
+TEST_F(FileBackEndTest, GivesAWarmSnapshotOfTenThousandNodesWithoutReadingThem) {
+    file.write(adapters("eth0", 10000));
+    file.age();
+    // Reading is a matter of tens of milliseconds each; ten thousand warm snapshots would take minutes if they read.
+    const auto first = backEnd->snapshot();
+    const auto start = std::chrono::steady_clock::now();
+    for (int i = 0; i < 10000; ++i) {
+        ASSERT_EQ(backEnd->snapshot(), first);
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(10));
+}
+
+} // namespace

@@ -1,0 +1,70 @@
+#include "agent/tree/Tree.h"
+#include "tests/agent/FakeBackEnd.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace {
+
+using namespace Orv::NodeLexicon;
+using Orv::Agent::Tree;
+using Orv::Test::makeNode;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+std::vector<std::string> pathsOf(const std::vector<Tree::NodePointer>& nodes) {
+    std::vector<std::string> paths;
+    for (const auto& node : nodes) {
+        paths.push_back(node->path);
+    }
+    return paths;
+}
+
+Tree sample() {
+    return Tree({makeNode("host", "", {}), makeNode("b", "host", NODE_NETWORK_ADAPTER),
+                 makeNode("p", "host", NODE_NETWORK_PORT), makeNode("a", "host", NODE_NETWORK_ADAPTER)});
+}
+
+TEST(Tree, ListsNodesOfATypeInTheOrderGiven) {
+    const Tree tree = sample();
+    EXPECT_THAT(pathsOf(tree.nodesOfType(NODE_NETWORK_ADAPTER)), ElementsAre("b", "a"));
+    EXPECT_THAT(pathsOf(tree.nodesOfType(NODE_NETWORK_PORT)), ElementsAre("p"));
+    EXPECT_THAT(pathsOf(tree.nodes()), ElementsAre("host", "b", "p", "a"));
+}
+
+TEST(Tree, HasNoNodesOfATypeThatDoesNotOccur) {
+    EXPECT_THAT(Tree().nodesOfType(NODE_NETWORK_PORT), IsEmpty());
+    EXPECT_THAT(sample().nodesOfType(static_cast<NodeType>(13)), IsEmpty());
+}
+
+TEST(Tree, FindsANodeByItsPathWhole) {
+    const Tree tree = sample();
+    ASSERT_NE(tree.find("a"), nullptr);
+    EXPECT_EQ(tree.find("a")->path, "a");
+    EXPECT_EQ(tree.find("hos"), nullptr);
+    EXPECT_EQ(tree.find(""), nullptr);
+}
+
+TEST(Tree, DropsTheLaterOfTwoNodesOfOnePath) {
+    const Tree tree({makeNode("a", "", NODE_NETWORK_ADAPTER, "first"),
+                     makeNode("a", "", NODE_NETWORK_ADAPTER, "second"), makeNode("b", "", NODE_NETWORK_ADAPTER)});
+    EXPECT_THAT(pathsOf(tree.nodesOfType(NODE_NETWORK_ADAPTER)), ElementsAre("a", "b"));
+    EXPECT_EQ(tree.nodes().size(), 2U);
+    EXPECT_EQ(tree.find("a")->description, "first");
+}
+
+TEST(Tree, SharesItsNodesWithWhoeverGaveThem) {
+    const auto node = makeNode("a", "", NODE_NETWORK_ADAPTER);
+    const Tree before({node});
+    const Tree after({node, makeNode("b", "", NODE_NETWORK_ADAPTER)});
+    EXPECT_EQ(before.find("a"), after.find("a"));
+}
+
+TEST(Tree, FindsEveryNodeAfterBeingMoved) {
+    Tree tree = sample();
+    const Tree moved = std::move(tree);
+    EXPECT_NE(moved.find("p"), nullptr);
+    EXPECT_THAT(pathsOf(moved.nodesOfType(NODE_NETWORK_ADAPTER)), ElementsAre("b", "a"));
+}
+
+} // namespace
