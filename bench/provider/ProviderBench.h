@@ -1,0 +1,48 @@
+/**
+ * @file
+ * The set-up that the provider's benchmarks share: a described host, a broker and the provider library.
+ */
+#pragma once
+
+#include "host/broker/Broker.h"
+
+#include <memory>
+#include <string>
+
+#include <cmpift.h>
+
+namespace marlo::bench {
+
+/**
+ * Points the agent of this process at a description of `adapters` adapters, each with every property, and reads it
+ * once. Later calls replace the description.
+ */
+void describeHost(int adapters);
+
+/** The broker that both sides of the comparison use, without classes of other providers. */
+const broker::Broker& sharedBroker();
+
+/** The instance MI of the configuration provider, loaded as an object manager loads it. */
+CMPIInstanceMI* configurationProvider();
+
+/** Counts what is returned and keeps nothing. */
+class CountingSink final : public broker::ResultSink {
+  public:
+    void instance(const CMPIInstance& /*instance*/) override { ++count; }
+
+    void path(const CMPIObjectPath& /*path*/) override { ++count; }
+
+    void data(const CMPIData& /*data*/) override { ++count; }
+
+    void error(CMPIrc /*code*/, const std::string& /*message*/) override {}
+
+    long count = 0;
+};
+
+/**
+ * The floor: makes the calls of one EnumInstances of the configuration class to the broker, the agent and the log, in
+ * a flat loop over the adapters, with nothing around them and ready-made log lines.
+ */
+void enumerateFlat(const CMPIBroker* broker, const CMPIResult* result, const CMPIObjectPath* reference);
+
+} // namespace marlo::bench
