@@ -35,6 +35,10 @@ struct ObjectManagerOptions {
     std::string schemaDirectory;   ///< *.mof
     std::string providerDirectory; ///< *.toml, a registration file per provider library
     std::string libraryDirectory;  ///< where registered libraries with a relative name lie
+
+    /** Receives what providers log and what is wrong with their answers, from any thread; none: standard error. */
+    std::function<void(const std::string& line)> log;
+    bool trace = false; ///< the log receives what providers trace as well
 };
 
 /**
@@ -54,7 +58,10 @@ class ObjectManager {
 
     /**
      * Instances of a class and of its subclasses, each with a complete path (namespace and keys, no host) and with
-     * the properties that were asked for.
+     * those properties that were asked for and that its provider set.
+     *
+     * All operations: a sink may throw, which ends the operation with what it threw. Unknown namespaces, classes and
+     * property names, wrong keys and classes that no provider serves are refused without asking a provider.
      */
     Status enumerateInstances(const std::string& nameSpace, const std::string& className,
                               const PropertyList& properties, const InstanceSink& sink);

@@ -1,0 +1,265 @@
+#include "host/cimom/ObjectManager.h"
+
+#include "host/broker/Broker.h"
+#include "host/cimom/AgentLog.h"
+#include "host/cimom/ClassChecks.h"
+#include "host/cimom/InstanceChecks.h"
+#include "host/cimom/Provider.h"
+#include "host/cimom/ProviderCall.h"
+#include "host/cimom/SchemaKnowledge.h"
+
+#include <iostream>
+#include <utility>
+
+#include <pwd.h>
+#include <unistd.h>
+
+namespace marlo {
+
+namespace {
+
+/** Operations that providers ask each other for in a circle end here, long before the stack does. */
+constexpr int deepestUpCall = 16;
+
+thread_local int depth = 0;
+
+/** Counts the operations that are under way on this thread, one within the other. */
+class DepthGuard {
+  public:
+    DepthGuard() {
+        if (depth == deepestUpCall) {
+            throw RequestError(CMPI_RC_ERR_FAILED, "providers ask each other in a circle: " +
+                                                       std::to_string(deepestUpCall) + " requests within requests");
+        }
+        ++depth;
+    }
+
+    ~DepthGuard() { --depth; }
+
+    DepthGuard(const DepthGuard&) = delete;
+    DepthGuard& operator=(const DepthGuard&) = delete;
+};
+
+/** The name of the user that the process works for. */
+std::string principalName() {
+    std::vector<char> buffer(16 * 1024);
+    passwd entry{};
+    passwd* found = nullptr;
+    const uid_t user = geteuid();
+    if (getpwuid_r(user, &entry, buffer.data(), buffer.size(), &found) == 0 && found != nullptr) {
+        return found->pw_name;
+    }
+    return std::to_string(user);
+}
+
+void writeToStandardError(const std::string& line) {
+    std::cerr << line + '\n'; // one write per line: threads log concurrently
+}
+
+broker::LogSink brokerLog(std::function<void(const std::string&)> log, bool trace) {
+    return [log = std::move(log), trace](const broker::LogLine& line) {
+        if (trace || !line.trace) {
+            log(line.component + ": " + line.text);
+        }
+    };
+}
+
+} // namespace
+
+struct ObjectManager::State final : broker::UpCalls {
+    explicit State(const ObjectManagerOptions& options)
+        : schema(Schema::readDirectory(options.schemaDirectory)),
+          knowledge(schema),
+          principal(principalName()),
+          log(options.log ? options.log : writeToStandardError),
+          onceLog(log),
+          broker(knowledge, this, brokerLog(log, options.trace)) {
+        for (Registration& registration :
+             readRegistrations(options.providerDirectory, options.libraryDirectory, schema)) {
+            providers.push_back(std::make_unique<Provider>(std::move(registration), broker.handle()));
+        }
+    }
+
+    ~State() override;
+
+    /** A provider and the class that it is to be asked for. */
+    struct Service {
+        Provider* provider;
+        const Class* definition;
+    };
+
+    std::vector<Service> servicesOf(const std::string& nameSpace, const Class& definition) const;
+
+    /** Runs an operation: what is refused and what the agent logs goes into its status. */
+    template <typename Operation>
+    static Status run(const Operation& operation);
+
+    Status enumerate(const std::string& nameSpace, const std::string& className, const PropertyList& properties,
+                     const InstanceSink& sink);
+    Status enumerateNames(const std::string& nameSpace, const std::string& className, const PathSink& sink);
+    Status get(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+
+    broker::Outcome enumerateInstances(const ObjectPath& classPath, const PropertyNames& properties,
+                                       const UpCalls::InstanceSink& sink) override;
+    broker::Outcome enumerateInstanceNames(const ObjectPath& classPath, const UpCalls::PathSink& sink) override;
+    broker::Outcome getInstance(const ObjectPath& path, const PropertyNames& properties,
+                                const UpCalls::InstanceSink& sink) override;
+    broker::Outcome deliverIndication(const std::string& nameSpace, Instance&& indication) override;
+
+    Schema schema;
+    SchemaKnowledge knowledge;
+    std::string principal;
+    std::function<void(const std::string&)> log;
+    OnceLog onceLog;
+    broker::Broker broker;
+    std::vector<std::unique_ptr<Provider>> providers;
+};
+
+ObjectManager::State::~State() {
+    const broker::CallScope scope;
+    const CMPIContext* context = broker.newContext();
+    for (const auto& provider : providers) {
+        provider->cleanUp(*context);
+    }
+}
+
+std::vector<ObjectManager::State::Service> ObjectManager::State::servicesOf(const std::string& nameSpace,
+                                                                            const Class& definition) const {
+    std::vector<Service> services;
+    for (const Class* candidate : schema.withSubclasses(nameSpace, definition.name)) {
+        for (const auto& provider : providers) {
+            if (provider->serves(ProviderKind::instance, nameSpace, candidate->name)) {
+                services.push_back({provider.get(), candidate});
+            }
+        }
+    }
+    if (services.empty()) {
+        throw RequestError(CMPI_RC_ERR_NOT_SUPPORTED,
+                           "no provider serves the instances of " + definition.name + " in " + nameSpace);
+    }
+    return services;
+}
+
+template <typename Operation>
+Status ObjectManager::State::run(const Operation& operation) {
+    AgentLogCollector collector;
+    Status status;
+    try {
+        const DepthGuard guard;
+        status = operation();
+    } catch (const RequestError& error) {
+        status = {error.code(), error.what(), {}};
+    }
+    status.reported = collector.take();
+    return status;
+}
+
+Status ObjectManager::State::enumerate(const std::string& nameSpace, const std::string& className,
+                                       const PropertyList& properties, const InstanceSink& sink) {
+    const Class& definition = requireClass(schema, nameSpace, className);
+    requireProperties(schema, nameSpace, definition, properties);
+    for (const auto& [provider, served] : servicesOf(nameSpace, definition)) {
+        InstanceChecks checks(schema, nameSpace, *served, provider->registration().name, onceLog);
+        ProviderCall call(broker, *provider, principal);
+        Status status = call.enumerateInstances(
+            {"", nameSpace, served->name, {}}, namesToAsk(*served, properties), [&](Instance&& instance) {
+                if (auto checked = checks.checkInstance(std::move(instance), properties)) {
+                    sink(*std::move(checked));
+                }
+            });
+        if (!status.ok()) {
+            return status;
+        }
+    }
+    return {};
+}
+
+Status ObjectManager::State::enumerateNames(const std::string& nameSpace, const std::string& className,
+                                            const PathSink& sink) {
+    const Class& definition = requireClass(schema, nameSpace, className);
+    for (const auto& [provider, served] : servicesOf(nameSpace, definition)) {
+        InstanceChecks checks(schema, nameSpace, *served, provider->registration().name, onceLog);
+        ProviderCall call(broker, *provider, principal);
+        Status status = call.enumerateInstanceNames({"", nameSpace, served->name, {}}, [&](ObjectPath&& path) {
+            if (auto checked = checks.checkPath(path)) {
+                sink(*std::move(checked));
+            }
+        });
+        if (!status.ok()) {
+            return status;
+        }
+    }
+    return {};
+}
+
+Status ObjectManager::State::get(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink) {
+    const Class& definition = requireClass(schema, path.nameSpace, path.className);
+    requireProperties(schema, path.nameSpace, definition, properties);
+    const ObjectPath checkedPath = requireKeys(definition, path.nameSpace, path);
+    const Service service = servicesOf(path.nameSpace, definition).front();
+    if (service.definition != &definition) {
+        throw RequestError(CMPI_RC_ERR_NOT_SUPPORTED,
+                           "no provider serves the instances of " + definition.name + " itself in " + path.nameSpace);
+    }
+    InstanceChecks checks(schema, path.nameSpace, definition, service.provider->registration().name, onceLog);
+    ProviderCall call(broker, *service.provider, principal);
+    bool found = false;
+    Status status = call.getInstance(checkedPath, namesToAsk(definition, properties), [&](Instance&& instance) {
+        auto checked = found ? std::nullopt : checks.checkInstance(std::move(instance), properties);
+        if (checked) {
+            found = true;
+            sink(*std::move(checked));
+        }
+    });
+    if (status.ok() && !found) {
+        status = {CMPI_RC_ERR_NOT_FOUND, "there is no instance " + checkedPath.toString(), {}};
+    }
+    return status;
+}
+
+broker::Outcome ObjectManager::State::enumerateInstances(const ObjectPath& classPath, const PropertyNames& properties,
+                                                         const UpCalls::InstanceSink& sink) {
+    const Status status = run([&] { return enumerate(classPath.nameSpace, classPath.className, properties, sink); });
+    return {status.code, status.message};
+}
+
+broker::Outcome ObjectManager::State::enumerateInstanceNames(const ObjectPath& classPath,
+                                                             const UpCalls::PathSink& sink) {
+    const Status status = run([&] { return enumerateNames(classPath.nameSpace, classPath.className, sink); });
+    return {status.code, status.message};
+}
+
+broker::Outcome ObjectManager::State::getInstance(const ObjectPath& path, const PropertyNames& properties,
+                                                  const UpCalls::InstanceSink& sink) {
+    const Status status = run([&] { return get(path, properties, sink); });
+    return {status.code, status.message};
+}
+
+/** Nobody can subscribe to indications here. */
+broker::Outcome ObjectManager::State::deliverIndication(const std::string& /*nameSpace*/, Instance&& /*indication*/) {
+    return {CMPI_RC_ERR_NOT_SUPPORTED, "indications are not delivered by this object manager"};
+}
+
+ObjectManager::ObjectManager(const ObjectManagerOptions& options) : _state(std::make_unique<State>(options)) {}
+
+ObjectManager::~ObjectManager() = default;
+
+Status ObjectManager::enumerateInstances(const std::string& nameSpace, const std::string& className,
+                                         const PropertyList& properties, const InstanceSink& sink) {
+    return State::run([&] { return _state->enumerate(nameSpace, className, properties, sink); });
+}
+
+Status ObjectManager::enumerateInstanceNames(const std::string& nameSpace, const std::string& className,
+                                             const PathSink& sink) {
+    return State::run([&] { return _state->enumerateNames(nameSpace, className, sink); });
+}
+
+Status ObjectManager::getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink) {
+    return State::run([&] { return _state->get(path, properties, sink); });
+}
+
+const Schema& ObjectManager::schema() const {
+    return _state->schema;
+}
+
+} // namespace marlo

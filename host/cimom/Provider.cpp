@@ -1,0 +1,114 @@
+#include "host/cimom/Provider.h"
+
+#include "host/broker/Broker.h"
+#include "host/cimom/AgentLog.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <memory>
+#include <utility>
+
+#include <cxxabi.h>
+#include <dlfcn.h>
+
+namespace marlo {
+
+namespace {
+
+bool containsName(const std::vector<std::string>& names, std::string_view name) {
+    return std::any_of(names.begin(), names.end(), [name](const auto& entry) { return equalNames(entry, name); });
+}
+
+std::string dlerrorText() {
+    const char* text = dlerror();
+    return text == nullptr ? "no reason given" : text;
+}
+
+} // namespace
+
+std::string currentExceptionText() {
+    try {
+        throw;
+    } catch (const std::exception& error) {
+        return error.what();
+    } catch (...) {
+        const std::type_info* type = abi::__cxa_current_exception_type();
+        if (type == nullptr) {
+            return "an exception of a foreign language";
+        }
+        int code = 0;
+        const std::unique_ptr<char, decltype(&std::free)> name(
+            abi::__cxa_demangle(type->name(), nullptr, nullptr, &code), &std::free);
+        return std::string("an exception of type ") + (code == 0 ? name.get() : type->name());
+    }
+}
+
+Provider::Provider(Registration registration, const CMPIBroker* broker)
+    : _registration(std::move(registration)), _broker(broker) {}
+
+bool Provider::serves(ProviderKind kind, std::string_view nameSpace, std::string_view className) const {
+    const auto& kinds = _registration.kinds;
+    return std::find(kinds.begin(), kinds.end(), kind) != kinds.end() &&
+           containsName(_registration.nameSpaces, nameSpace) && containsName(_registration.classes, className);
+}
+
+void* Provider::symbol(const std::string& name) {
+    if (_library == nullptr) {
+        _library = dlopen(_registration.library.c_str(), RTLD_NOW | RTLD_LOCAL);
+        if (_library == nullptr) {
+            throw LoadError("provider " + _registration.name + ": cannot load " + _registration.library + ": " +
+                            dlerrorText());
+        }
+        AgentLogCollector::connect();
+    }
+    void* found = dlsym(_library, name.c_str());
+    if (found == nullptr) {
+        throw LoadError("provider " + _registration.name + ": no factory " + name + " in " + _registration.library +
+                        ": " + dlerrorText());
+    }
+    return found;
+}
+
+/** All factories have this type but for what they return, which is a pointer for all of them. */
+void* Provider::make(const std::string& factory, const CMPIContext& context) {
+    using Factory = void* (*)(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
+    const auto function = reinterpret_cast<Factory>(symbol(factory));
+    const std::string where =
+        "provider " + _registration.name + ": factory " + factory + " of " + _registration.library;
+    CMPIStatus status{};
+    void* made = nullptr;
+    try {
+        made = function(_broker, &context, &status);
+    } catch (...) {
+        throw LoadError(where + " threw: " + currentExceptionText());
+    }
+    if (made == nullptr) {
+        const std::string reason = broker::messageOf(status);
+        throw LoadError(where + " made nothing" + (reason.empty() ? "" : ": " + reason));
+    }
+    return made;
+}
+
+CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
+    const std::lock_guard lock(_mutex);
+    if (_instanceMI == nullptr) {
+        _instanceMI = static_cast<CMPIInstanceMI*>(make(_registration.name + "_Create_InstanceMI", context));
+    }
+    return *_instanceMI;
+}
+
+void Provider::cleanUp(const CMPIContext& context) {
+    const std::lock_guard lock(_mutex);
+    if (_instanceMI == nullptr) {
+        return;
+    }
+    try {
+        _instanceMI->ft->cleanup(_instanceMI, &context, 1);
+    } catch (...) {
+        // The process ends: nobody is left to whom a failed cleanup would matter.
+        static_cast<void>(currentExceptionText());
+    }
+    _instanceMI = nullptr;
+}
+
+} // namespace marlo

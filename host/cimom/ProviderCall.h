@@ -1,0 +1,46 @@
+/**
+ * @file
+ * One call of one provider's instance interface.
+ */
+#pragma once
+
+#include "host/broker/Broker.h"
+#include "host/cimom/ObjectManager.h"
+#include "host/cimom/Provider.h"
+
+#include <functional>
+
+namespace marlo {
+
+/**
+ * Calls a provider with all that CMPI prepares for it and releases what the call created when it is over.
+ *
+ * Answers go to the sinks as they come. What the provider throws becomes CMPI_RC_ERR_FAILED with its text; what a
+ * sink throws is thrown on once the provider has returned.
+ */
+class ProviderCall {
+  public:
+    using InstanceSink = std::function<void(Instance&&)>;
+    using PathSink = std::function<void(ObjectPath&&)>;
+
+    ProviderCall(const broker::Broker& broker, Provider& provider, const std::string& principal)
+        : _broker(broker), _provider(provider), _principal(principal) {}
+
+    Status enumerateInstances(const ObjectPath& classPath, const PropertyList& properties, const InstanceSink& sink);
+    Status enumerateInstanceNames(const ObjectPath& classPath, const PathSink& sink);
+    Status getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+
+  private:
+    struct Arguments;
+    using Function = std::function<CMPIStatus(CMPIInstanceMI&, const Arguments&)>;
+
+    Status call(const ObjectPath& path, const PropertyList& properties, broker::ResultSink& sink,
+                const Function& function);
+    Status statusOf(const CMPIStatus& answered) const;
+
+    const broker::Broker& _broker;
+    Provider& _provider;
+    const std::string& _principal;
+};
+
+} // namespace marlo
