@@ -40,7 +40,7 @@ CMPIStatus answer(const CMPIInstanceMI* mi, const CMPIResult* result, const CMPI
     } catch (const std::exception& error) {
         return failure(broker, error.what());
     } catch (...) {
-        return failure(broker, "the network hardware could not be read");
+        return failure(broker, "the request failed, and what was thrown does not say why");
     }
 }
 
