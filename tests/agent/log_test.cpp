@@ -229,6 +229,7 @@ TEST_F(LogTest, SurvivesAnObserverThatThrows) {
 }
 
 TEST_F(LogTest, MayBeObservedAndConfiguredWhileThreadsLog) {
+    configure(6000, 6000);
     std::vector<std::thread> threads;
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([] {
