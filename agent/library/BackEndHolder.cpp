@@ -3,13 +3,10 @@
 #include "agent/config/Configuration.h"
 #include "agent/file/FileBackEnd.h"
 #include "agent/library/Log.h"
-#ifdef ORV_AGENT_LINUX
 #include "agent/linux/LinuxBackEnd.h"
-#endif
 
 #include <atomic>
 #include <mutex>
-#include <stdexcept>
 
 namespace Orv::Agent {
 
@@ -19,11 +16,7 @@ std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
     if (configuration.backEnd == Configuration::BackEndKind::File) {
         return makeFileBackEnd(configuration.treeFile);
     }
-#ifdef ORV_AGENT_LINUX
     return Linux::makeLinuxBackEnd();
-#else
-    throw std::runtime_error("this agent has no back end for the host itself");
-#endif
 }
 
 } // namespace
