@@ -31,23 +31,19 @@ std::string nameOf(toml::node_type type) {
     }
 }
 
-[[noreturn]] void refuseAt(const std::string& file, toml::source_index line, const std::string& rest) {
-    throw std::runtime_error(file + ":" + std::to_string(line) + ": " + rest);
-}
-
 } // namespace
 
-toml::table parseToml(std::string_view text, const std::string& file) {
+toml::table parseToml(std::string_view text, const TomlSource& source) {
     try {
         return toml::parse(text);
     } catch (const toml::parse_error& error) {
-        refuseAt(file, error.source().begin.line, cleanText(error.description()));
+        throw std::runtime_error(source.file + ":" + std::to_string(source.lineOf(error.source())) + ": " +
+                                 cleanText(error.description()));
     }
 }
 
-void refuse(const std::string& file, const toml::source_region& where, const std::string& key,
-            const std::string& reason) {
-    refuseAt(file, where.begin.line, cleanText(key) + ": " + reason);
+void refuse(const std::string& file, std::size_t line, const std::string& key, const std::string& reason) {
+    throw std::runtime_error(file + ":" + std::to_string(line) + ": " + cleanText(key) + ": " + reason);
 }
 
 toml::node* TomlReader::find(std::string_view key) {
@@ -55,13 +51,17 @@ toml::node* TomlReader::find(std::string_view key) {
     return _table.get(key);
 }
 
-void TomlReader::refuseKey(std::string_view key, const std::string& reason) const {
+std::size_t TomlReader::lineOf(std::string_view key) const {
     const toml::node* value = _table.get(key);
-    refuse(_file, value != nullptr ? value->source() : _table.source(), _prefix + std::string(key), reason);
+    return _source.lineOf(value != nullptr ? value->source() : _table.source());
+}
+
+void TomlReader::refuseKey(std::string_view key, const std::string& reason) const {
+    refuse(_source.file, lineOf(key), std::string(_prefix).append(key), reason);
 }
 
 void TomlReader::refuseType(std::string_view key, const toml::node& value, std::string_view expected) const {
-    refuse(_file, value.source(), _prefix + std::string(key),
+    refuse(_source.file, _source.lineOf(value.source()), std::string(_prefix).append(key),
            "expected " + std::string(expected) + ", found " + nameOf(value.type()));
 }
 
@@ -164,7 +164,8 @@ void TomlReader::refuseOtherKeys() const {
         }
     }
     if (first != nullptr) {
-        refuse(_file, first->source(), _prefix + std::string(first->str()), "unknown key");
+        refuse(_source.file, _source.lineOf(first->source()), std::string(_prefix).append(first->str()),
+               "unknown key");
     }
 }
 

@@ -18,11 +18,21 @@
 
 namespace Orv::Agent {
 
-/** Parses a document. `file` is how messages name it. Throws std::runtime_error with file, line and reason. */
-toml::table parseToml(std::string_view text, const std::string& file);
+/** Where a document, or a part of one, comes from, as messages say it. */
+struct TomlSource {
+    std::string file;
+    std::size_t firstLine = 1; ///< the line of the file that the part starts with
+
+    [[nodiscard]] std::size_t lineOf(const toml::source_region& where) const {
+        return firstLine - 1 + where.begin.line;
+    }
+};
+
+/** Parses a document. Throws std::runtime_error with file, line and reason. */
+toml::table parseToml(std::string_view text, const TomlSource& source);
 
 /** Throws std::runtime_error "FILE:LINE: KEY: REASON". */
-[[noreturn]] void refuse(const std::string& file, const toml::source_region& where, const std::string& key,
+[[noreturn]] void refuse(const std::string& file, std::size_t line, const std::string& key,
                          const std::string& reason);
 
 /**
@@ -31,12 +41,11 @@ toml::table parseToml(std::string_view text, const std::string& file);
  */
 class TomlReader {
   public:
-    /**
-     * `prefix` stands before the table's keys in messages: "adapter." or nothing. All three must outlive this, and
-     * so must every key that is asked for.
-     */
-    TomlReader(toml::table& table, const std::string& file, const std::string& prefix)
-        : _table(table), _file(file), _prefix(prefix) {}
+    /** `prefix` stands before the table's keys in messages: "adapter." or nothing. */
+    TomlReader(toml::table& table, const TomlSource& source, std::string_view prefix)
+        : _table(table), _source(source), _prefix(prefix) {}
+
+    // Table, source, prefix and every key that is asked for must outlive the reader.
 
     std::optional<std::string> text(std::string_view key);
     std::optional<std::uint64_t> integer(std::string_view key, std::uint64_t highest);
@@ -55,14 +64,17 @@ class TomlReader {
     /** Throws about one key of this table, at the place of its value or else at the table's own. */
     [[noreturn]] void refuseKey(std::string_view key, const std::string& reason) const;
 
+    /** The line of a key's value, or else of the table. */
+    [[nodiscard]] std::size_t lineOf(std::string_view key) const;
+
   private:
     toml::node* find(std::string_view key);
     [[noreturn]] void refuseType(std::string_view key, const toml::node& value, std::string_view expected) const;
     const std::string& requireText(std::string_view key, const toml::node& value) const;
 
     toml::table& _table;
-    const std::string& _file;
-    const std::string& _prefix;
+    const TomlSource& _source;
+    const std::string_view _prefix;
     std::vector<std::string_view> _known;
 };
 

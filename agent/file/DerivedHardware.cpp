@@ -1,6 +1,10 @@
 #include "agent/file/DerivedHardware.h"
 
 #include <algorithm>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <unordered_set>
 #include <utility>
 
 namespace Orv::Agent {
@@ -12,10 +16,15 @@ using namespace NodeLexicon;
 constexpr std::uint16_t moduleOrCard = 9; ///< CIM_PhysicalPackage.PackageType
 
 template <typename Value>
-std::optional<Value> propertyOf(const DescribedNode& node, Properties property) {
+std::optional<Value> propertyOf(const Node& node, Properties property) {
     const auto found = node.properties.find(property);
     const Value* value = found == node.properties.end() ? nullptr : std::get_if<Value>(&found->second);
     return value == nullptr ? std::nullopt : std::optional<Value>(*value);
+}
+
+/** A node's description where it says more than the identity, which stands in for it. */
+std::optional<std::string> ownDescription(const Node& node, const std::string& identity) {
+    return node.description == identity ? std::nullopt : std::optional(node.description);
 }
 
 /** CIM_ManagedSystemElement.Status of an adapter's status code. */
@@ -42,63 +51,73 @@ std::optional<std::string> permanentAddress(const std::string& macAddress) {
     return fits ? std::optional(std::move(digits)) : std::nullopt;
 }
 
-} // namespace
+/** Gathers ports, and the cards that they are on. */
+class HardwareDeriver {
+  public:
+    explicit HardwareDeriver(const Tree& tree) : _tree(tree) {}
 
-DerivedHardware::Adapter DerivedHardware::adapterOf(const DescribedNode& node) {
-    return {node.identity,
-            node.description,
-            node.device,
-            propertyOf<std::string>(node, PROP_MAC_ADDRESS),
-            propertyOf<unsigned int>(node, PROP_STATUS),
-            node.chassis == managementChassis};
-}
+    void addPortOf(const Node& adapter);
 
-DescribedNode DerivedHardware::portNode(const DescribedNode& adapter) {
-    DescribedNode port{NODE_NETWORK_PORT, adapter.identity, adapter.description, {}, std::nullopt, {}};
-    if (auto address = propertyOf<std::string>(adapter, PROP_MAC_ADDRESS)) {
-        port.properties.emplace(PROP_MAC_ADDRESS, std::move(*address));
-    }
-    return port;
-}
+    HardwareInventory inventory;
 
-DerivedHardware::Card& DerivedHardware::cardOf(const Adapter& adapter, const std::string& devicePath) {
-    const auto [found, isNew] = _cards.emplace(devicePath, Card{_inventory.cards.size(), 0});
+  private:
+    struct Card {
+        std::size_t index;
+        std::uint16_t ports;
+    };
+
+    Card& cardOf(const Node& device, const NetworkPort& firstPort);
+
+    const Tree& _tree;
+    std::unordered_map<std::string_view, Card> _cards; ///< by device path
+    std::unordered_set<std::string> _names;
+};
+
+HardwareDeriver::Card& HardwareDeriver::cardOf(const Node& device, const NetworkPort& firstPort) {
+    const auto [found, isNew] = _cards.emplace(device.path, Card{inventory.cards.size(), 0});
     if (isNew) {
         NetworkCard card;
-        card.name = *adapter.identity;
-        card.elementName = adapter.device;
+        card.name = firstPort.name;
+        card.status = firstPort.status;
+        card.elementName = ownDescription(device, firstPort.name);
         card.packageType = moduleOrCard;
-        card.managementController = adapter.managementController;
-        if (adapter.status) {
-            card.status = statusText(*adapter.status);
-        }
-        _inventory.cards.push_back(std::move(card));
+        card.managementController = firstPort.managementController;
+        inventory.cards.push_back(std::move(card));
     }
     return found->second;
 }
 
-void DerivedHardware::add(const Adapter& adapter, const std::string& devicePath) {
-    if (!adapter.identity || !_names.emplace(*adapter.identity, true).second) {
+void HardwareDeriver::addPortOf(const Node& adapter) {
+    const auto identity = propertyOf<std::string>(adapter, PROP_NODE_STRING);
+    if (!identity || !_names.insert(*identity).second) {
         return;
     }
-    Card& card = cardOf(adapter, devicePath);
+    const Tree::NodePointer device = _tree.find(adapter.parentPath);
+    const Tree::NodePointer chassis = _tree.find(device->parentPath);
     NetworkPort port;
-    port.name = *adapter.identity;
-    port.card = _inventory.cards[card.index].name;
-    port.description = adapter.description;
+    port.name = *identity;
+    port.description = ownDescription(adapter, *identity);
+    port.managementController = chassis->description == managementChassis;
+    if (const auto address = propertyOf<std::string>(adapter, PROP_MAC_ADDRESS)) {
+        port.permanentAddress = permanentAddress(*address);
+    }
+    if (const auto status = propertyOf<unsigned int>(adapter, PROP_STATUS)) {
+        port.status = statusText(*status);
+    }
+    Card& card = cardOf(*device, port);
+    port.card = inventory.cards[card.index].name;
     port.portNumber = card.ports++;
-    port.managementController = adapter.managementController;
-    if (adapter.macAddress) {
-        port.permanentAddress = permanentAddress(*adapter.macAddress);
-    }
-    if (adapter.status) {
-        port.status = statusText(*adapter.status);
-    }
-    _inventory.ports.push_back(std::move(port));
+    inventory.ports.push_back(std::move(port));
 }
 
-HardwareInventory DerivedHardware::inventory() && {
-    return std::move(_inventory);
+} // namespace
+
+HardwareInventory deriveHardware(const Tree& tree) {
+    HardwareDeriver deriver(tree);
+    for (const auto& adapter : tree.nodesOfType(NODE_NETWORK_ADAPTER)) {
+        deriver.addPortOf(*adapter);
+    }
+    return std::move(deriver.inventory);
 }
 
 } // namespace Orv::Agent

@@ -62,7 +62,7 @@ class FileBackEnd : public BackEnd {
         std::shared_ptr<const Tree> tree = same ? _last.tree : nullptr;
         _last = {}; // whatever is thrown from here on, the former state is not served again
         if (tree == nullptr) {
-            tree = parseTreeDescription(file.text, _path).tree;
+            tree = parseTree(file.text, _path);
         }
         _last = {std::move(tree), file.stamp, file.settled, hash};
     }

@@ -27,14 +27,16 @@ struct DescribedNode {
 /** Builds host → chassis → device → node, with the devices and chassis that the nodes name. */
 class TreeBuilder {
   public:
-    explicit TreeBuilder(std::string hostDescription);
+    TreeBuilder();
 
-    /** Adds a node below its device; nodes are met in the order in which they were added. Returns its device's path.
-     */
-    std::string add(DescribedNode node);
+    /** "Host" when it is not called. */
+    void describeHost(std::string description);
 
-    /** Adds a node below a device that add has returned. */
-    void addBelow(const std::string& devicePath, DescribedNode node);
+    /** Adds a node below its device; nodes are met in the order in which they were added. */
+    void add(DescribedNode node);
+
+    /** Gives every adapter a port node below the same device, with the identity and the MAC address. */
+    void addPortsOfAdapters();
 
     std::shared_ptr<const Tree> build();
 
@@ -42,9 +44,10 @@ class TreeBuilder {
     std::string chassisPath(const std::string& description);
     std::string devicePath(const DescribedNode& node);
     std::string newPath(char kind, const std::string& name);
-    void addNode(std::string path, std::string parentPath, std::string description);
+    void addUntyped(std::string path, std::string parentPath, std::string description);
 
-    std::vector<Tree::NodePointer> _nodes;
+    std::string _hostDescription;
+    std::vector<Tree::NodePointer> _nodes;               ///< all but the host
     std::unordered_map<std::string, unsigned> _pathUses; ///< how many nodes have asked for a path
     std::unordered_map<std::string, std::string> _chassis;
     std::unordered_map<std::string, std::string> _devices; ///< by chassis path and description

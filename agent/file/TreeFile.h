@@ -32,4 +32,7 @@ TreeDescription readTreeFile(const std::string& path);
 /** The same of a text that has been read already; `file` is how messages name it. */
 TreeDescription parseTreeDescription(std::string_view text, const std::string& file);
 
+/** The same, without the hardware. */
+std::shared_ptr<const Tree> parseTree(std::string_view text, const std::string& file);
+
 } // namespace Orv::Agent

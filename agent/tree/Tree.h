@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "agent/tree/PropertyMap.h"
 #include "instrumentation/NodeLexicon.h"
 
 #include <map>
@@ -12,13 +13,9 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
-#include <variant>
 #include <vector>
 
 namespace Orv::Agent {
-
-using PropertyValue = std::variant<unsigned int, std::string, std::vector<std::string>>;
-using PropertyMap = std::map<NodeLexicon::Properties, PropertyValue>;
 
 /** One node. All texts are valid UTF-8 without control characters. */
 struct Node {

@@ -7,6 +7,8 @@
 namespace {
 
 using namespace Orv::NodeLexicon;
+using Orv::Agent::PropertyMap;
+using Orv::Agent::PropertyValue;
 using Orv::Agent::Tree;
 using Orv::Test::makeNode;
 using testing::ElementsAre;
@@ -23,6 +25,34 @@ std::vector<std::string> pathsOf(const std::vector<Tree::NodePointer>& nodes) {
 Tree sample() {
     return Tree({makeNode("host", "", {}), makeNode("b", "host", NODE_NETWORK_ADAPTER),
                  makeNode("p", "host", NODE_NETWORK_PORT), makeNode("a", "host", NODE_NETWORK_ADAPTER)});
+}
+
+TEST(PropertyMap, IsOrderedByPropertyHoweverItWasFilled) {
+    PropertyMap map;
+    map.emplace(PROP_STATUS, 1U);
+    map.emplace(PROP_DHCP_ENABLED, 3U);
+    map.emplace(PROP_IPV4_ADDRESS, std::string("a"));
+    std::vector<Properties> order;
+    for (const auto& [property, value] : map) {
+        order.push_back(property);
+    }
+    EXPECT_THAT(order, ElementsAre(PROP_DHCP_ENABLED, PROP_IPV4_ADDRESS, PROP_STATUS));
+    EXPECT_EQ(map, (PropertyMap{{PROP_IPV4_ADDRESS, std::string("a")}, {PROP_STATUS, 1U}, {PROP_DHCP_ENABLED, 3U}}));
+}
+
+TEST(PropertyMap, FindsWhatItHoldsAndNothingElse) {
+    const PropertyMap map{{PROP_STATUS, 1U}, {PROP_DHCP_ENABLED, 3U}};
+    ASSERT_NE(map.find(PROP_STATUS), map.end());
+    EXPECT_EQ(map.find(PROP_STATUS)->second, PropertyValue(1U));
+    EXPECT_EQ(map.find(PROP_IPV4_ADDRESS), map.end());
+    EXPECT_EQ(PropertyMap().find(PROP_STATUS), PropertyMap().end());
+}
+
+TEST(PropertyMap, KeepsTheFirstValueOfAProperty) {
+    PropertyMap map{{PROP_STATUS, 1U}};
+    map.emplace(PROP_STATUS, 5U);
+    EXPECT_EQ(map, (PropertyMap{{PROP_STATUS, 1U}}));
+    EXPECT_EQ(map.size(), 1U);
 }
 
 TEST(Tree, ListsNodesOfATypeInTheOrderGiven) {
