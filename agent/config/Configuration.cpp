@@ -36,13 +36,13 @@ std::optional<Configuration::BackEndKind> backEndOf(std::string_view name) {
     return name == "file" ? std::optional(Configuration::BackEndKind::File) : std::nullopt;
 }
 
-void readChannel(TomlReader& file, const TomlSource& source, std::string_view name, ChannelConfiguration& channel) {
+void readChannel(TomlReader& file, const std::string& path, std::string_view name, ChannelConfiguration& channel) {
     toml::table* table = file.table(name);
     if (table == nullptr) {
         return;
     }
     const std::string prefix = std::string(name) + ".";
-    TomlReader reader(*table, source, prefix);
+    TomlReader reader(*table, path, prefix);
     channel.level = static_cast<int>(reader.integer("level", highestLevel).value_or(channel.level));
     channel.sinks = reader.texts("sinks").value_or(channel.sinks);
     for (const std::string& sink : channel.sinks) {
@@ -152,13 +152,12 @@ Configuration readConfiguredFile() {
 
 Configuration readConfigurationFile(const std::string& path) {
     const TextFile file = readTextFile(path);
-    const TomlSource source{path};
-    toml::table table = parseToml(file.text, source);
-    TomlReader reader(table, source, "");
+    toml::table table = parseToml(file.text, path);
+    TomlReader reader(table, path, "");
     Configuration configuration;
     readBackEnd(reader, path, configuration);
-    readChannel(reader, source, "log", configuration.log);
-    readChannel(reader, source, "trace", configuration.trace);
+    readChannel(reader, path, "log", configuration.log);
+    readChannel(reader, path, "trace", configuration.trace);
     reader.refuseOtherKeys();
     return configuration;
 }

@@ -33,11 +33,11 @@ std::string nameOf(toml::node_type type) {
 
 } // namespace
 
-toml::table parseToml(std::string_view text, const TomlSource& source) {
+toml::table parseToml(std::string_view text, const std::string& file, std::size_t firstLine) {
     try {
         return toml::parse(text);
     } catch (const toml::parse_error& error) {
-        throw std::runtime_error(source.file + ":" + std::to_string(source.lineOf(error.source())) + ": " +
+        throw std::runtime_error(file + ":" + std::to_string(firstLine - 1 + error.source().begin.line) + ": " +
                                  cleanText(error.description()));
     }
 }
@@ -51,17 +51,21 @@ toml::node* TomlReader::find(std::string_view key) {
     return _table.get(key);
 }
 
+std::size_t TomlReader::lineOf(const toml::source_region& where) const {
+    return _firstLine - 1 + where.begin.line;
+}
+
 std::size_t TomlReader::lineOf(std::string_view key) const {
     const toml::node* value = _table.get(key);
-    return _source.lineOf(value != nullptr ? value->source() : _table.source());
+    return lineOf(value != nullptr ? value->source() : _table.source());
 }
 
 void TomlReader::refuseKey(std::string_view key, const std::string& reason) const {
-    refuse(_source.file, lineOf(key), std::string(_prefix).append(key), reason);
+    refuse(_file, lineOf(key), std::string(_prefix).append(key), reason);
 }
 
 void TomlReader::refuseType(std::string_view key, const toml::node& value, std::string_view expected) const {
-    refuse(_source.file, _source.lineOf(value.source()), std::string(_prefix).append(key),
+    refuse(_file, lineOf(value.source()), std::string(_prefix).append(key),
            "expected " + std::string(expected) + ", found " + nameOf(value.type()));
 }
 
@@ -164,8 +168,7 @@ void TomlReader::refuseOtherKeys() const {
         }
     }
     if (first != nullptr) {
-        refuse(_source.file, _source.lineOf(first->source()), std::string(_prefix).append(first->str()),
-               "unknown key");
+        refuse(_file, lineOf(first->source()), std::string(_prefix).append(first->str()), "unknown key");
     }
 }
 

@@ -18,18 +18,11 @@
 
 namespace Orv::Agent {
 
-/** Where a document, or a part of one, comes from, as messages say it. */
-struct TomlSource {
-    std::string file;
-    std::size_t firstLine = 1; ///< the line of the file that the part starts with
-
-    [[nodiscard]] std::size_t lineOf(const toml::source_region& where) const {
-        return firstLine - 1 + where.begin.line;
-    }
-};
-
-/** Parses a document. Throws std::runtime_error with file, line and reason. */
-toml::table parseToml(std::string_view text, const TomlSource& source);
+/**
+ * Parses a document, or a part of one that starts with line `firstLine` of the file. Throws std::runtime_error with
+ * file, line and reason.
+ */
+toml::table parseToml(std::string_view text, const std::string& file, std::size_t firstLine = 1);
 
 /** Throws std::runtime_error "FILE:LINE: KEY: REASON". */
 [[noreturn]] void refuse(const std::string& file, std::size_t line, const std::string& key,
@@ -41,11 +34,12 @@ toml::table parseToml(std::string_view text, const TomlSource& source);
  */
 class TomlReader {
   public:
-    /** `prefix` stands before the table's keys in messages: "adapter." or nothing. */
-    TomlReader(toml::table& table, const TomlSource& source, std::string_view prefix)
-        : _table(table), _source(source), _prefix(prefix) {}
-
-    // Table, source, prefix and every key that is asked for must outlive the reader.
+    /**
+     * `prefix` stands before the table's keys in messages: "adapter." or nothing. `firstLine` as for parseToml. The
+     * table, both texts and every key that is asked for must outlive the reader.
+     */
+    TomlReader(toml::table& table, const std::string& file, std::string_view prefix, std::size_t firstLine = 1)
+        : _table(table), _file(file), _prefix(prefix), _firstLine(firstLine) {}
 
     std::optional<std::string> text(std::string_view key);
     std::optional<std::uint64_t> integer(std::string_view key, std::uint64_t highest);
@@ -69,12 +63,14 @@ class TomlReader {
 
   private:
     toml::node* find(std::string_view key);
+    [[nodiscard]] std::size_t lineOf(const toml::source_region& where) const;
     [[noreturn]] void refuseType(std::string_view key, const toml::node& value, std::string_view expected) const;
     const std::string& requireText(std::string_view key, const toml::node& value) const;
 
     toml::table& _table;
-    const TomlSource& _source;
+    const std::string& _file;
     const std::string_view _prefix;
+    const std::size_t _firstLine;
     std::vector<std::string_view> _known;
 };
 

@@ -90,7 +90,7 @@ void DescriptionReader::readHost(TomlReader& document) {
     if (table == nullptr) {
         return;
     }
-    TomlReader reader(*table, _source, "host.");
+    TomlReader reader(*table, _file, "host.", _firstLine);
     if (auto description = reader.text("description")) {
         _builder.describeHost(std::move(*description));
     }
@@ -98,7 +98,7 @@ void DescriptionReader::readHost(TomlReader& document) {
 }
 
 void DescriptionReader::readAdapter(toml::table& table) {
-    TomlReader reader(table, _source, "adapter.");
+    TomlReader reader(table, _file, "adapter.", _firstLine);
     DescribedNode node = readNode(reader, NODE_NETWORK_ADAPTER);
     readProperties(reader, node.properties);
     reader.refuseOtherKeys();
@@ -106,7 +106,7 @@ void DescriptionReader::readAdapter(toml::table& table) {
 }
 
 void DescriptionReader::readPort(toml::table& table) {
-    TomlReader reader(table, _source, "port.");
+    TomlReader reader(table, _file, "port.", _firstLine);
     DescribedNode node = readNode(reader, NODE_NETWORK_PORT);
     if (auto address = reader.text("mac_address")) {
         node.properties.emplace(PROP_MAC_ADDRESS, std::move(*address));
@@ -127,7 +127,7 @@ void DescriptionReader::readPort(toml::table& table) {
 }
 
 void DescriptionReader::readCard(toml::table& table) {
-    TomlReader reader(table, _source, "card.");
+    TomlReader reader(table, _file, "card.", _firstLine);
     const auto name = reader.text("name");
     if (!name) {
         reader.refuseKey("name", "a card needs a name");
@@ -146,7 +146,7 @@ void DescriptionReader::readCard(toml::table& table) {
 }
 
 void DescriptionReader::readDocument(toml::table& document) {
-    TomlReader reader(document, _source, "");
+    TomlReader reader(document, _file, "", _firstLine);
     readHost(reader);
     for (toml::table* adapter : reader.tables("adapter")) {
         readAdapter(*adapter);
@@ -168,7 +168,7 @@ void DescriptionReader::checkCards() const {
     }
     for (const auto& [card, line] : _cardReferences) {
         if (!names.contains(card)) {
-            refuse(_source.file, line, "port.card", "no card is named \"" + card + '"');
+            refuse(_file, line, "port.card", "no card is named \"" + card + '"');
         }
     }
 }
@@ -194,7 +194,7 @@ bool DescriptionReader::readInParts(const std::vector<DocumentPart>& parts) {
         if (!isAlike(document, &part == &parts.front())) {
             return false;
         }
-        _source.firstLine = part.firstLine;
+        _firstLine = part.firstLine;
         readDocument(document);
     }
     return true;
@@ -206,7 +206,7 @@ DescribedHost DescriptionReader::read(std::string_view text, const std::string& 
         return inParts.result();
     }
     DescriptionReader whole(file);
-    toml::table document = parseToml(text, whole._source);
+    toml::table document = parseToml(text, file);
     whole.readDocument(document);
     return whole.result();
 }

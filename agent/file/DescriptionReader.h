@@ -39,7 +39,7 @@ class DescriptionReader {
         std::size_t line;
     };
 
-    explicit DescriptionReader(const std::string& file) : _source{file} {}
+    explicit DescriptionReader(const std::string& file) : _file(file) {}
 
     bool readInParts(const std::vector<DocumentPart>& parts);
     void readDocument(toml::table& document);
@@ -50,7 +50,8 @@ class DescriptionReader {
     void checkCards() const;
     DescribedHost result();
 
-    TomlSource _source;
+    const std::string& _file;
+    std::size_t _firstLine = 1; ///< of the part that is being read
     TreeBuilder _builder;
     HardwareInventory _hardware;
     std::vector<CardReference> _cardReferences;
