@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cstdlib>
-#include <cstring>
 
 namespace marlo::broker {
 
@@ -11,7 +10,8 @@ namespace {
 constexpr std::size_t callBlock = 4096;
 constexpr std::size_t sharedBlock = 512;
 constexpr std::size_t largestBlock = std::size_t{64} * 1024;
-constexpr std::size_t alignment = alignof(std::max_align_t);
+/** Nothing in CMPI is aligned more strictly than pointers and 64-bit numbers. */
+constexpr std::size_t alignment = alignof(std::uint64_t);
 
 constexpr std::size_t aligned(std::size_t bytes) {
     return (bytes + alignment - 1) / alignment * alignment;
@@ -19,7 +19,7 @@ constexpr std::size_t aligned(std::size_t bytes) {
 
 } // namespace
 
-struct alignas(alignment) Arena::Block {
+struct Arena::Block {
     Block* next;
 };
 
@@ -83,13 +83,6 @@ void* Arena::allocateBlock(Part& part, std::size_t bytes) {
         part.nextSize = std::min(part.nextSize * 2, largestBlock);
     }
     return memory;
-}
-
-const char* Arena::copy(std::string_view text) {
-    auto* copied = static_cast<char*>(allocate(text.size() + 1));
-    std::copy(text.begin(), text.end(), copied);
-    copied[text.size()] = '\0';
-    return copied;
 }
 
 StringObject** Arena::nameCache() {

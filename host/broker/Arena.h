@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <memory>
 #include <mutex>
 #include <new>
@@ -35,25 +36,22 @@ class Arena {
     Arena(const Arena&) = delete;
     Arena& operator=(const Arena&) = delete;
 
-    /** Uninitialised memory, aligned for anything. Throws std::bad_alloc. */
+    /** Uninitialised memory, aligned for pointers and 64-bit numbers. Throws std::bad_alloc. */
     void* allocate(std::size_t bytes);
 
     template <typename T, typename... Arguments>
     T* make(Arguments&&... arguments) {
-        static_assert(std::is_trivially_destructible_v<T>);
+        static_assert(std::is_trivially_destructible_v<T> && alignof(T) <= alignof(std::uint64_t));
         return ::new (allocate(sizeof(T))) T(std::forward<Arguments>(arguments)...);
     }
 
     template <typename T>
     T* makeArray(std::size_t count) {
-        static_assert(std::is_trivially_destructible_v<T>);
+        static_assert(std::is_trivially_destructible_v<T> && alignof(T) <= alignof(std::uint64_t));
         T* array = static_cast<T*>(allocate(count * sizeof(T)));
         std::uninitialized_value_construct_n(array, count);
         return array;
     }
-
-    /** A zero-terminated copy. */
-    const char* copy(std::string_view text);
 
     /** Strings by which names that recur in this arena are found again; null when the caller may not use it. */
     StringObject** nameCache();

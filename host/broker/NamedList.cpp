@@ -13,28 +13,6 @@ namespace {
 /** Holds the properties of an ordinary class without growing again. */
 constexpr CMPICount firstCapacity = 12;
 
-/** FNV-1a. */
-std::size_t hashOf(std::string_view name) {
-    std::uint32_t hash = 2166136261U;
-    for (const char c : name) {
-        hash = (hash ^ static_cast<unsigned char>(c)) * 16777619U;
-    }
-    return hash;
-}
-
-/** The same few names recur in every instance of a call: one string for all of them. */
-StringObject* nameString(Arena& arena, std::string_view name) {
-    StringObject** cache = arena.nameCache();
-    if (cache == nullptr) {
-        return StringObject::make(arena, name);
-    }
-    StringObject*& slot = cache[hashOf(name) % Arena::nameCacheSize];
-    if (slot == nullptr || slot->text() != name) {
-        slot = StringObject::make(arena, name);
-    }
-    return slot;
-}
-
 } // namespace
 
 const NamedData* NamedList::find(std::string_view name) const {
@@ -51,7 +29,7 @@ void NamedList::set(std::string_view name, const CMPIData& data) {
     if (_size == _capacity) {
         grow(_capacity == 0 ? firstCapacity : _capacity * 2);
     }
-    _entries[_size] = {nameString(*_arena, name), data};
+    _entries[_size] = {StringObject::makeRecurring(*_arena, name), data};
     ++_size;
 }
 

@@ -108,10 +108,13 @@ class StringObject final : public Object<CMPIString, Kind::string> {
   public:
     static StringObject* make(Arena& arena, std::string_view text);
 
-    [[nodiscard]] std::string_view text() const { return {_text, _length}; }
+    /** For texts that recur in every object of a call: mostly one string for all of them. */
+    static StringObject* makeRecurring(Arena& arena, std::string_view text);
 
-    /** Zero-terminated. */
-    [[nodiscard]] const char* characters() const { return _text; }
+    [[nodiscard]] std::string_view text() const { return {characters(), _length}; }
+
+    /** Zero-terminated; they follow the object. */
+    [[nodiscard]] const char* characters() const { return reinterpret_cast<const char*>(this + 1); }
 
     /** Itself where it lies in `target` already. */
     StringObject* copyTo(Arena& target);
@@ -119,11 +122,9 @@ class StringObject final : public Object<CMPIString, Kind::string> {
   private:
     friend class Arena;
 
-    StringObject(Arena& arena, const char* text, std::size_t length)
-        : Object(&arena, stringTable), _text(text), _length(length) {}
+    StringObject(Arena& arena, std::uint32_t length) : Object(&arena, stringTable), _length(length) {}
 
-    const char* _text;
-    std::size_t _length;
+    std::uint32_t _length;
 };
 
 class ArrayObject final : public Object<CMPIArray, Kind::array> {
