@@ -131,8 +131,7 @@ void KernelReader::readRoutes(std::uint8_t family) {
     std::vector<Route> routes;
     const auto collect = [&](const nlmsghdr& message) {
         const Message parsed = parseMessage(message);
-        const auto* route = std::get_if<Change<Route>>(&parsed);
-        if (route != nullptr && route->object.destinationLength == 0) {
+        if (const auto* route = std::get_if<Change<Route>>(&parsed)) {
             routes.push_back(route->object);
         }
     };

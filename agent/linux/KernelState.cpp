@@ -17,8 +17,8 @@ constexpr std::size_t familySlot(std::uint8_t family) {
     return family == AF_INET ? 0 : 1;
 }
 
-bool isDefault(const Route& route) {
-    return route.destinationLength == 0 && route.table == RT_TABLE_MAIN && route.type == RTN_UNICAST;
+bool leadsOut(const Route& route) {
+    return route.table == RT_TABLE_MAIN && route.type == RTN_UNICAST;
 }
 
 bool isSecondary(const Address& address) {
@@ -122,7 +122,7 @@ void KernelState::applyAddress(const Change<Address>& change) {
 
 void KernelState::applyRoute(const Change<Route>& change) {
     const Route& route = change.object;
-    if (route.destinationLength == 0 && route.table == RT_TABLE_MAIN) {
+    if (route.table == RT_TABLE_MAIN) {
         _staleRoutes.at(familySlot(route.family)) = true;
     }
 }
@@ -138,7 +138,7 @@ void KernelState::setRoutes(std::uint8_t family, const std::vector<Route>& route
                      [&](const DefaultRoute& route) { return route.family != family; });
     }
     for (const Route& route : routes) {
-        if (!isDefault(route) || route.family != family) {
+        if (!leadsOut(route) || route.family != family) {
             continue;
         }
         for (const NextHop& hop : route.hops) {

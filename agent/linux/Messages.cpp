@@ -236,13 +236,13 @@ Message parseRoute(const nlmsghdr& message) {
     Bytes attributes;
     const auto* header = headerOf<rtmsg>(message, attributes);
     // A cloned route is an entry of the cache, not of a table.
-    if (header == nullptr || addressLength(header->rtm_family) == 0 || (header->rtm_flags & RTM_F_CLONED) != 0) {
+    if (header == nullptr || header->rtm_dst_len != 0 || addressLength(header->rtm_family) == 0 ||
+        (header->rtm_flags & RTM_F_CLONED) != 0) {
         return {};
     }
     Change<Route> change{{}, message.nlmsg_type == RTM_DELROUTE};
     Route& route = change.object;
     route.family = header->rtm_family;
-    route.destinationLength = header->rtm_dst_len;
     route.type = header->rtm_type;
     route.table = header->rtm_table;
     NextHop only{0, static_cast<std::uint8_t>(header->rtm_flags), {}};

@@ -53,12 +53,12 @@ struct NextHop {
     bool operator==(const NextHop&) const = default;
 };
 
+/** A default route: one whose destination is everything. */
 struct Route {
     std::uint8_t family = 0;
-    std::uint8_t destinationLength = 0; ///< prefix length; 0 for a default route
-    std::uint8_t type = 0;              ///< RTN_*
-    std::uint8_t preference = 0;        ///< ICMPV6_ROUTER_PREF_* of RFC 4191
-    std::uint32_t table = 0;            ///< RT_TABLE_*
+    std::uint8_t type = 0;       ///< RTN_*
+    std::uint8_t preference = 0; ///< ICMPV6_ROUTER_PREF_* of RFC 4191
+    std::uint32_t table = 0;     ///< RT_TABLE_*
     std::uint32_t metric = 0;
     std::vector<NextHop> hops;
 
@@ -83,7 +83,10 @@ struct Change {
     bool operator==(const Change&) const = default;
 };
 
-/** One message; nothing when it is of another kind, malformed, or says nothing that counts here. */
+/**
+ * One message; nothing when it is of another kind, malformed, or says nothing that counts here, as a route to
+ * anywhere in particular.
+ */
 using Message = std::variant<std::monostate, Change<Link>, Change<Address>, Change<Route>, Change<Neighbour>>;
 
 /**
