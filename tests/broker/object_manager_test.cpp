@@ -231,7 +231,9 @@ INSTANTIATE_TEST_SUITE_P(
                             "provider ThrowsException threw: the text of the exception"},
                     OddCase{"ThrowsInt", CMPI_RC_ERR_FAILED, "provider ThrowsInt threw: an exception of type int"},
                     OddCase{"NullFactory", CMPI_RC_ERR_FAILED, "made nothing: not today"},
-                    OddCase{"ThrowingFactory", CMPI_RC_ERR_FAILED, "threw: the factory's text"},
+                    OddCase{"ThrowingFactory", CMPI_RC_ERR_FAILED,
+                            "factory ThrowingFactory_Create_InstanceMI of " PROVIDER_DIRECTORY
+                            "/libodd_providers.so threw: the factory's text"},
                     OddCase{"NoReason", CMPI_RC_ERR_ACCESS_DENIED, "provider NoReason gave no reason"},
                     OddCase{"Reason", CMPI_RC_ERR_ACCESS_DENIED, "the provider's own reason"},
                     OddCase{"ForeignCode", CMPI_RC_ERR_FAILED, "CMPI return code 60"},

@@ -125,6 +125,19 @@ TEST_F(Services, TakeResultsUntilDone) {
     EXPECT_EQ(status.rc, CMPI_RC_ERR_NOT_SUPPORTED);
 }
 
+TEST_F(Services, GiveResultsTheirCompletePath) {
+    CMPIObjectPath* name = path();
+    CMAddKey(name, "Id", "from path", CMPI_chars);
+    CMPIInstance* thing = CMNewInstance(mb, name, nullptr);
+    const CMPIUint16 number = 5;
+    CMSetProperty(thing, "Id", "from property", CMPI_chars);
+    CMSetProperty(thing, "number", &number, CMPI_uint16);
+    RecordingSink sink;
+    const broker::Result result(sink);
+    CMReturnInstance(result.handle(), thing);
+    EXPECT_EQ(sink.given, std::vector<std::string>{"root/test:Thing.Id=\"from path\",Number=5"});
+}
+
 TEST_F(Services, KeepWhatASinkThrowsFromTheProvider) {
     RecordingSink sink;
     const broker::Result result(sink);
