@@ -6,7 +6,7 @@
 #include <stdexcept>
 
 using scripted_agent::add;
-using scripted_agent::announce;
+using scripted_agent::announced;
 using scripted_agent::Node;
 using scripted_agent::quoted;
 using scripted_agent::script;
@@ -78,13 +78,23 @@ struct Instrumentation::State {
     std::vector<Node*> selection;
     std::size_t position = 0;
 
-    void announced(const std::string& call) const {
-        announce(call);
-        add("cursor " + std::to_string(number) + ": " + call);
+    /** A call that has no result. */
+    template <typename Describe>
+    void called(const Describe& describe) const {
+        told(announced(describe));
     }
 
-    void told(const std::string& call, const std::string& result) const {
-        add("cursor " + std::to_string(number) + ": " + call + " = " + result);
+    void told(const std::string& call) const {
+        if (scripted_agent::watched()) {
+            add("cursor " + std::to_string(number) + ": " + call);
+        }
+    }
+
+    template <typename Describe>
+    void told(const std::string& call, const Describe& result) const {
+        if (scripted_agent::watched()) {
+            told(call + " = " + result());
+        }
     }
 
     [[nodiscard]] bool stands() const { return position < selection.size(); }
@@ -98,11 +108,10 @@ struct Instrumentation::State {
 
     template <typename Value>
     bool read(NodeLexicon::Properties property, Value& value) const {
-        const std::string call = "getProperty(" + nameOf(property) + ")";
-        announce(call);
+        const std::string call = announced([&] { return "getProperty(" + nameOf(property) + ")"; });
         auto& properties = propertiesOf(node(), value);
         const auto found = properties.find(property);
-        told(call, found != properties.end() ? shown(found->second) : "absent");
+        told(call, [&] { return found != properties.end() ? shown(found->second) : "absent"; });
         if (found == properties.end()) {
             return false;
         }
@@ -112,24 +121,24 @@ struct Instrumentation::State {
 
     template <typename Value>
     void write(NodeLexicon::Properties property, const Value& value) const {
-        announced("setProperty(" + nameOf(property) + ", " + shown(value) + ")");
+        called([&] { return "setProperty(" + nameOf(property) + ", " + shown(value) + ")"; });
         propertiesOf(node(), value)[property] = value;
     }
 };
 
 Instrumentation::Instrumentation() : _state(nullptr) {
-    announce("Instrumentation()");
+    const std::string call = announced([] { return std::string("Instrumentation()"); });
     _state = new State{scripted_agent::nextCursor(), {}};
-    add("cursor " + std::to_string(_state->number) + ": Instrumentation()");
+    _state->told(call);
 }
 
 Instrumentation::~Instrumentation() {
-    add("cursor " + std::to_string(_state->number) + ": ~Instrumentation()");
+    _state->told("~Instrumentation()");
     delete _state;
 }
 
 void Instrumentation::selectNode(NodeLexicon::NodeType type) {
-    _state->announced("selectNode(" + nameOf(type) + ")");
+    _state->called([&] { return "selectNode(" + nameOf(type) + ")"; });
     _state->selection.clear();
     _state->position = 0;
     for (Node& node : script().nodes) {
@@ -140,7 +149,7 @@ void Instrumentation::selectNode(NodeLexicon::NodeType type) {
 }
 
 void Instrumentation::selectNode(const std::string& path) {
-    _state->announced("selectNode(" + shown(path) + ")");
+    _state->called([&] { return "selectNode(" + shown(path) + ")"; });
     _state->selection.clear();
     _state->position = 0;
     const auto found =
@@ -151,13 +160,13 @@ void Instrumentation::selectNode(const std::string& path) {
 }
 
 Instrumentation::operator bool() const {
-    announce("bool");
-    _state->told("bool", _state->stands() ? "true" : "false");
+    const std::string call = announced([] { return std::string("bool"); });
+    _state->told(call, [&] { return _state->stands() ? "true" : "false"; });
     return _state->stands();
 }
 
 Instrumentation& Instrumentation::operator++() {
-    _state->announced("++");
+    _state->called([&] { return std::string("++"); });
     ++_state->position;
     return *this;
 }
@@ -187,26 +196,26 @@ void Instrumentation::setProperty(NodeLexicon::Properties property, std::vector<
 }
 
 std::string Instrumentation::getNodeDescription() {
-    announce("getNodeDescription()");
+    const std::string call = announced([] { return std::string("getNodeDescription()"); });
     std::string description = _state->node().description;
-    _state->told("getNodeDescription()", shown(description));
+    _state->told(call, [&] { return shown(description); });
     return description;
 }
 
 std::string Instrumentation::getPathToParentNode() {
-    announce("getPathToParentNode()");
+    const std::string call = announced([] { return std::string("getPathToParentNode()"); });
     std::string parent = _state->node().parent;
-    _state->told("getPathToParentNode()", shown(parent));
+    _state->told(call, [&] { return shown(parent); });
     return parent;
 }
 
 void Instrumentation::startMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
-    _state->announced("startMonitoring(" + nameOf(type) + ")");
+    _state->called([&] { return "startMonitoring(" + nameOf(type) + ")"; });
     script().monitorings.push_back({type, callback, context});
 }
 
 void Instrumentation::stopMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
-    _state->announced("stopMonitoring(" + nameOf(type) + ")");
+    _state->called([&] { return "stopMonitoring(" + nameOf(type) + ")"; });
     std::erase(script().monitorings, scripted_agent::Monitoring{type, callback, context});
 }
 

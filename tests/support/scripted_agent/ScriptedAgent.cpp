@@ -66,6 +66,10 @@ void failAt(std::string call, int nth, std::function<void()> failure) {
     };
 }
 
+bool watched() {
+    return script().recording || script().before;
+}
+
 void announce(const std::string& call) {
     if (script().before) {
         script().before(call);

@@ -10,7 +10,7 @@
 #include <cmpimacs.h>
 
 using scripted_agent::add;
-using scripted_agent::announce;
+using scripted_agent::announced;
 using scripted_agent::quoted;
 using scripted_agent::script;
 
@@ -132,8 +132,7 @@ CMPIStatus copyProperty(const CMPIData& source, CMPIInstance* target, const char
 namespace Orv {
 
 bool textEqual(const char* left, const char* right) {
-    const std::string call = "textEqual(" + quoted(left) + ", " + quoted(right) + ")";
-    announce(call);
+    const std::string call = announced([&] { return "textEqual(" + quoted(left) + ", " + quoted(right) + ")"; });
     const bool equal = script().textEqual                    ? script().textEqual(left, right)
                        : left == nullptr || right == nullptr ? left == right
                                                              : equalNames(left, right);
@@ -142,8 +141,7 @@ bool textEqual(const char* left, const char* right) {
 }
 
 std::string stripSpaces(std::string text) {
-    const std::string call = "stripSpaces(" + quoted(text.c_str()) + ")";
-    announce(call);
+    const std::string call = announced([&] { return "stripSpaces(" + quoted(text.c_str()) + ")"; });
     if (script().stripSpaces) {
         text = script().stripSpaces(text);
     } else {
@@ -154,14 +152,14 @@ std::string stripSpaces(std::string text) {
 }
 
 std::string getSystemName() {
-    announce("getSystemName()");
+    (void)announced([] { return std::string("getSystemName()"); });
     add("getSystemName() = " + quoted(script().systemName.c_str()));
     return script().systemName;
 }
 
 bool isObjPathsEqual(const CMPIObjectPath* left, const CMPIObjectPath* right, bool compareNameSpace) {
-    const std::string call = std::string("isObjPathsEqual(") + (compareNameSpace ? "true)" : "false)");
-    announce(call);
+    const std::string call =
+        announced([&] { return std::string("isObjPathsEqual(") + (compareNameSpace ? "true)" : "false)"); });
     const bool equal = script().isObjPathsEqual ? script().isObjPathsEqual(left, right, compareNameSpace)
                                                 : samePaths(left, right, compareNameSpace);
     add(call + (equal ? " = true" : " = false"));
@@ -169,8 +167,8 @@ bool isObjPathsEqual(const CMPIObjectPath* left, const CMPIObjectPath* right, bo
 }
 
 void mapProperty(CMPIData source, CMPIInstance* target, const char* name, DataType type, CMPIStatus* status) {
-    const std::string call = "mapProperty(" + quoted(name) + ", " + std::to_string(type) + ")";
-    announce(call);
+    const std::string call =
+        announced([&] { return "mapProperty(" + quoted(name) + ", " + std::to_string(type) + ")"; });
     add(call);
     if (script().mapProperty) {
         script().mapProperty(source, target, name, type, status);
