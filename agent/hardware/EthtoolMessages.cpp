@@ -41,7 +41,9 @@ std::optional<Reply> parseReply(Bytes payload, std::uint8_t command, std::uint16
 std::vector<std::uint32_t> bitSetMask(const Attributes& bitSet) {
     const auto mask = bitSet.find(ETHTOOL_A_BITSET_MASK).value_or(Bytes());
     std::vector<std::uint32_t> words(mask.size() / sizeof(std::uint32_t));
-    std::memcpy(words.data(), mask.data(), words.size() * sizeof(std::uint32_t));
+    if (!words.empty()) {
+        std::memcpy(words.data(), mask.data(), words.size() * sizeof(std::uint32_t));
+    }
     return words;
 }
 
