@@ -48,6 +48,7 @@ class Arena {
     template <typename T>
     T* makeArray(std::size_t count) {
         static_assert(std::is_trivially_destructible_v<T> && alignof(T) <= alignof(std::uint64_t));
+        // NOLINTNEXTLINE(bugprone-sizeof-expression): T may well be a pointer
         T* array = static_cast<T*>(allocate(count * sizeof(T)));
         std::uninitialized_value_construct_n(array, count);
         return array;

@@ -12,7 +12,7 @@ namespace marlo::broker {
 Value toModel(const CMPIData& data);
 ObjectPath toModel(const ObjectPathObject& path);
 /** With the completed path. */
-Instance toModel(const InstanceObject& instance);
+Instance toModel(const InstanceObject& object);
 
 /** A value whose alternative does not fit its type becomes NULL. */
 CMPIData toData(Arena& arena, const BrokerState& broker, const Value& value);

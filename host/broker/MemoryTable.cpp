@@ -15,7 +15,7 @@ namespace {
 /** From now on what is created belongs to the mark, which is a number that no other mark of the process has. */
 CMPIGcStat* mark(CMPIStatus& /*status*/, BrokerState& /*broker*/) {
     static std::atomic<std::uintptr_t> last{0};
-    auto* token = reinterpret_cast<void*>(++last);
+    auto* token = reinterpret_cast<void*>(++last); // NOLINT(performance-no-int-to-ptr): never followed
     openScope(token);
     return token;
 }
@@ -45,8 +45,12 @@ char* cmpiStrDup(const CMPIBroker* /*broker*/, const char* text) {
     if (text == nullptr) {
         return nullptr;
     }
-    auto* copied = static_cast<char*>(currentArena().allocatePiece(std::strlen(text) + 1, false));
-    return copied == nullptr ? nullptr : std::strcpy(copied, text);
+    const std::size_t size = std::strlen(text) + 1;
+    auto* copied = static_cast<char*>(currentArena().allocatePiece(size, false));
+    if (copied != nullptr) {
+        std::memcpy(copied, text, size);
+    }
+    return copied;
 }
 
 /** Does nothing with what was not allocated here or is freed already. */

@@ -6,12 +6,12 @@
 
 #include <cerrno>
 #include <cstring>
+#include <ctime>
 #include <iostream>
 #include <memory>
 
 #include <cxxabi.h>
 #include <pthread.h>
-#include <time.h>
 
 namespace marlo::broker {
 
@@ -65,8 +65,8 @@ void* newThread(CMPIThreadFunc function, void* argument, int detached) {
     if (code != 0) {
         return nullptr;
     }
-    static_cast<void>(start.release()); // the thread's now
-    return reinterpret_cast<void*>(thread);
+    static_cast<void>(start.release());     // the thread's now
+    return reinterpret_cast<void*>(thread); // NOLINT(performance-no-int-to-ptr): CMPI has threads as pointers
 }
 
 int joinThread(void* thread, void** value) {
@@ -178,7 +178,10 @@ char* resolveFileName(const char* name) {
     }
     const std::string file = "lib" + std::string(name) + ".so";
     auto* copied = static_cast<char*>(currentArena().allocatePiece(file.size() + 1, false));
-    return copied == nullptr ? nullptr : std::strcpy(copied, file.c_str());
+    if (copied != nullptr) {
+        std::memcpy(copied, file.c_str(), file.size() + 1);
+    }
+    return copied;
 }
 
 } // namespace

@@ -42,7 +42,7 @@ class DepthGuard {
 
 /** The name of the user that the process works for. */
 std::string principalName() {
-    std::vector<char> buffer(16 * 1024);
+    std::vector<char> buffer(std::size_t{16} * 1024);
     passwd entry{};
     passwd* found = nullptr;
     const uid_t user = geteuid();

@@ -129,14 +129,14 @@ class FileReader {
     std::vector<std::string> readClasses(TomlReader& reader, const std::vector<std::string>& nameSpaces) const {
         std::vector<std::string> classes;
         for (const std::string& text : requireTexts(reader, "classes")) {
-            const Class* definition = nullptr;
-            for (const std::string& nameSpace : nameSpaces) {
-                definition = _schema.findClass(nameSpace, text);
-                if (definition == nullptr) {
-                    reader.refuseKey("classes", "the schema has no class '" + text + "' in " + nameSpace);
-                }
+            const auto without =
+                std::find_if(nameSpaces.begin(), nameSpaces.end(), [&](const std::string& nameSpace) {
+                    return _schema.findClass(nameSpace, text) == nullptr;
+                });
+            if (without != nameSpaces.end()) {
+                reader.refuseKey("classes", "the schema has no class '" + text + "' in " + *without);
             }
-            classes.push_back(definition->name);
+            classes.push_back(_schema.findClass(nameSpaces.front(), text)->name);
         }
         return classes;
     }

@@ -243,7 +243,7 @@ TEST_F(Scopes, LetAPreparedContextBeReleasedInsteadOfAttached) {
 TEST_F(Scopes, LetTwoThreadsChangeObjectsOfOneCall) {
     const broker::CallScope scope;
     CMPIInstance* theirs = thing("theirs");
-    std::thread other([this, theirs] {
+    std::thread other([theirs] {
         for (int i = 0; i < 2000; ++i) {
             CMSetProperty(theirs, ("P" + std::to_string(i)).c_str(), "value", CMPI_chars);
         }
