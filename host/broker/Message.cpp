@@ -87,6 +87,7 @@ std::string fillIn(std::string_view text, const std::vector<std::string>& insert
     return filled;
 }
 
+// NOLINTNEXTLINE(cert-dcl50-cpp): the slot is variadic
 CMPIString* getMessage(const CMPIBroker* broker, const char* /*id*/, const char* text, CMPIStatus* status,
                        CMPICount count, ...) {
     std::va_list arguments;
@@ -96,6 +97,7 @@ CMPIString* getMessage(const CMPIBroker* broker, const char* /*id*/, const char*
     return message;
 }
 
+// NOLINTNEXTLINE(cert-dcl50-cpp): the slot is variadic
 CMPIString* getMessage2(const CMPIBroker* broker, const char* /*id*/, CMPIMsgFileHandle /*file*/, const char* text,
                         CMPIStatus* status, CMPICount count, ...) {
     std::va_list arguments;

@@ -97,7 +97,7 @@ O* makeClone(O& object) {
     auto arena = std::make_unique<Arena>(Arena::Use::clone);
     O* copied = object.copyTo(*arena);
     arena->setRoot(static_cast<const ObjectBase*>(copied));
-    arena.release(); // by releaseSlot()
+    static_cast<void>(arena.release()); // ended by releaseSlot()
     return copied;
 }
 
