@@ -1,13 +1,8 @@
 #include "bench/provider/ProviderBench.h"
 
-#include "instrumentation/Instrumentation.h"
-
-#include <cstdlib>
-#include <fstream>
 #include <stdexcept>
 
 #include <dlfcn.h>
-#include <unistd.h>
 
 namespace marlo::bench {
 
@@ -53,36 +48,7 @@ class ConfigurationSchema final : public broker::SchemaView {
     std::vector<std::string> _keys{"SettingID"};
 };
 
-std::string descriptionFile() {
-    return "/tmp/marlo-bench-" + std::to_string(::getpid()) + ".toml";
-}
-
-void removeDescription() {
-    (void)::unlink(descriptionFile().c_str());
-}
-
 } // namespace
-
-void describeHost(int adapters) {
-    const std::string path = descriptionFile();
-    static const int atExit = std::atexit(removeDescription);
-    (void)atExit;
-    std::ofstream file(path, std::ios::trunc);
-    for (int i = 0; i < adapters; ++i) {
-        file << "[[adapter]]\nidentity = \"eth" << i << "\"\nstatus = 1\ndhcp = 3\nip_support = 3\n"
-             << "ipv4_address = \"10." << i / 62500 << '.' << i / 250 % 250 << '.' << i % 250 + 1 << "\"\n"
-             << "ipv4_subnet_mask = \"255.0.0.0\"\nipv6_address = \"2001:db8::" << std::hex << i + 1 << std::dec
-             << "\"\ndefault_gateway = \"10.255.255.254\"\ndns_servers = [\"192.0.2.53\", \"198.51.100.53\"]\n"
-             << "dns_suffixes = [\"example.com\", \"example.net\"]\ndns_hostname = \"host\"\n"
-             << "dns_domain = \"example.com\"\nmac_address = \"02:00:00:00:00:01\"\n";
-    }
-    file.close();
-    if (!file) {
-        throw std::runtime_error("cannot write " + path);
-    }
-    (void)::setenv("ORV_AGENT_TREE", path.c_str(), 1);
-    const Orv::Instrumentation warm;
-}
 
 const broker::Broker& sharedBroker() {
     static const ConfigurationSchema schema;

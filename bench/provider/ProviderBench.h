@@ -1,6 +1,6 @@
 /**
  * @file
- * The set-up that the provider's benchmarks share: a described host, a broker and the provider library.
+ * The two sides of the provider's benchmark: the provider library behind a broker, and the floor.
  */
 #pragma once
 
@@ -12,12 +12,6 @@
 #include <cmpift.h>
 
 namespace marlo::bench {
-
-/**
- * Points the agent of this process at a description of `adapters` adapters, each with every property, and reads it
- * once. Later calls replace the description.
- */
-void describeHost(int adapters);
 
 /** The broker that both sides of the comparison use, without classes of other providers. */
 const broker::Broker& sharedBroker();

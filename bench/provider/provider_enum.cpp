@@ -1,5 +1,6 @@
 // EnumInstances of the configuration class: the provider against a floor that makes the same calls in a flat loop.
 #include "bench/provider/ProviderBench.h"
+#include "bench/support/DescribedHost.h"
 
 #include <benchmark/benchmark.h>
 
@@ -14,7 +15,7 @@ constexpr const char* CLASS = "MARLO_NetworkAdapterConfiguration";
 template <typename Call>
 void measure(benchmark::State& state, Call call) {
     const auto adapters = static_cast<int>(state.range(0));
-    describeHost(adapters);
+    const DescribedHost host(adapters);
     const broker::Broker& broker = sharedBroker();
     for (auto _ : state) {
         const broker::CallScope scope;
