@@ -13,10 +13,38 @@ struct Entry {
     const void* tag; ///< null for a call and for the thread's own scope
 };
 
+using Entries = std::vector<Entry>;
+
+/*
+ * Both are trivial, so that they can still be asked when the thread's other objects are gone: a static object manager
+ * is destroyed after the main thread's thread-local objects, and calls providers once more.
+ */
+thread_local Entries* stackOfThread = nullptr;
+thread_local bool threadHasEnded = false;
+
 /** Scopes that a thread leaves open end with the thread. */
-std::vector<Entry>& entries() {
-    thread_local std::vector<Entry> stack;
-    return stack;
+struct EndOfThread {
+    EndOfThread() = default;
+
+    ~EndOfThread() {
+        delete stackOfThread;
+        stackOfThread = nullptr;
+        threadHasEnded = true;
+    }
+
+    EndOfThread(const EndOfThread&) = delete;
+    EndOfThread& operator=(const EndOfThread&) = delete;
+};
+
+Entries& entries() {
+    if (stackOfThread == nullptr) {
+        if (!threadHasEnded) {
+            static thread_local const EndOfThread end;
+            (void)end;
+        }
+        stackOfThread = new Entries; // of a thread that has ended: the process is about to
+    }
+    return *stackOfThread;
 }
 
 void open(const void* tag) {

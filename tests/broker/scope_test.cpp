@@ -3,6 +3,7 @@
 #include "tests/support/BrokerFixture.h"
 
 #include <atomic>
+#include <cstdlib>
 #include <thread>
 
 namespace marlo::test {
@@ -275,6 +276,29 @@ TEST_F(Scopes, OfManyThreadsDoNotMeet) {
         thread.join();
     }
     EXPECT_EQ(good, 1600);
+}
+
+/** Destroyed as static objects are: after the thread-local ones of the main thread. */
+struct LateCaller {
+    LateCaller() = default;
+
+    ~LateCaller() {
+        const broker::CallScope scope;
+        (void)broker::currentArena().copy("made at the end of the process");
+    }
+
+    LateCaller(const LateCaller&) = delete;
+    LateCaller& operator=(const LateCaller&) = delete;
+};
+
+[[noreturn]] void endWithALateCaller() {
+    static const LateCaller late;
+    (void)broker::currentArena().copy("made before");
+    std::exit(EXIT_SUCCESS);
+}
+
+TEST(ScopesDeathTest, CanBeOpenedByStaticObjectsThatEndWithTheProcess) {
+    EXPECT_EXIT(endWithALateCaller(), testing::ExitedWithCode(EXIT_SUCCESS), "");
 }
 
 } // namespace
