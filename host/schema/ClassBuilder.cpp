@@ -200,7 +200,7 @@ void ClassBuilder::checkOverride(const FeatureDeclaration& feature, const Qualif
         }
         return;
     }
-    const std::string& target = std::get<std::string>(qualifier->value.data);
+    const auto& target = std::get<std::string>(qualifier->value.data);
     const bool namesIt = equalNames(target.substr(target.rfind('.') + 1), feature.name);
     if (!namesIt || !isInherited) {
         throw Error(feature.at, _class.name + "." + feature.name + " overrides \"" + target +

@@ -4,12 +4,11 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <filesystem>
 #include <memory>
 #include <set>
-
-#include <stdio.h>
 
 namespace marlo::mof {
 
@@ -21,12 +20,12 @@ namespace fs = std::filesystem;
 constexpr int DeepestInclude = 16;
 
 struct FileCloser {
-    void operator()(FILE* file) const { fclose(file); }
+    void operator()(std::FILE* file) const { static_cast<void>(std::fclose(file)); }
 };
 
 /** The bytes of a file; throws std::runtime_error with the reason alone. */
 std::string readBytes(const std::string& path) {
-    const std::unique_ptr<FILE, FileCloser> file(fopen(path.c_str(), "re"));
+    const std::unique_ptr<std::FILE, FileCloser> file(std::fopen(path.c_str(), "re"));
     if (!file) {
         throw std::runtime_error(strerror(errno));
     }

@@ -1,12 +1,12 @@
 #include "tests/schema/Mof.h"
 
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <stdlib.h>
 
 namespace marlo::test {
 namespace {
