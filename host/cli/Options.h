@@ -1,0 +1,59 @@
+/**
+ * @file
+ * What the command line asks for.
+ */
+#pragma once
+
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace marlo::cli {
+
+/** A command line that asks for something that cannot be; the program ends with exit code 2. */
+class UsageError : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
+enum class Command { Adapters, Enumerate, Names, Get, Classes, Completion };
+
+/** What is told to the agent library of this process, over its own configuration. */
+struct AgentOptions {
+    std::string treeFile;
+    std::string configurationFile;
+    std::optional<int> logLevel;
+    std::vector<std::string> logSinks;
+    std::optional<int> traceLevel;
+    std::vector<std::string> traceSinks;
+};
+
+/** Directories that take the place of those beside the executable; empty where not given. */
+struct DirectoryOptions {
+    std::string schema;
+    std::string providers;
+    std::string libraries;
+};
+
+struct Options {
+    Command command = Command::Adapters;
+    std::string argument; ///< a class, a path or a shell
+    std::string nameSpace = "root/tavis";
+    std::vector<std::string> properties; ///< none: all
+    bool json = false;
+    bool namesOnly = false;
+    AgentOptions agent;
+    DirectoryOptions directories;
+};
+
+/** Options to be followed, or a text that answers the command line by itself (help, version, completion). */
+struct CommandLine {
+    std::optional<std::string> answer;
+    Options options;
+};
+
+/** Reads a command line; throws UsageError. */
+CommandLine readCommandLine(int argc, const char* const* argv);
+
+} // namespace marlo::cli
