@@ -42,7 +42,10 @@ class NetlinkSocket {
     /** `protocol` as NETLINK_ROUTE. Throws std::system_error. */
     explicit NetlinkSocket(int protocol);
 
-    /** Receives the payload (all behind the netlink header) of an answer; may throw. */
+    /**
+     * Receives the payload (all behind the netlink header) of an answer. What it throws leaves the rest of the answer
+     * in the socket, which is of no use then.
+     */
     using Handler = std::function<void(Bytes payload)>;
 
     /**

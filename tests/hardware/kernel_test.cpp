@@ -14,6 +14,7 @@
 #include <array>
 #include <atomic>
 #include <cctype>
+#include <chrono>
 #include <cstddef>
 #include <filesystem>
 #include <nlohmann/json.hpp>
@@ -24,6 +25,7 @@
 #include <gtest/gtest.h>
 #include <linux/filter.h>
 #include <linux/netlink.h>
+#include <linux/rtnetlink.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
@@ -108,6 +110,18 @@ TEST(KernelInventory, LeavesSpeedOpenWhereTheDriverKnowsNone) {
     EXPECT_FALSE(port.permanentAddress);
 }
 
+/** The kernel settles the state of a link in a worker, some time after the carrier has changed. */
+void waitForState(const Namespace& space, const std::string& name, const std::string& state) {
+    constexpr int attempts = 100;
+    for (int i = 0; i < attempts; ++i) {
+        if (json::parse(space.ip("-j link show " + name))[0]["operstate"] == state) {
+            return;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }
+    FAIL() << name << " did not become " << state;
+}
+
 TEST(KernelInventory, TellsTheStatusOfALink) {
     REQUIRE_NAMESPACES();
     const Namespace space;
@@ -116,6 +130,7 @@ TEST(KernelInventory, TellsTheStatusOfALink) {
     space.ip("link set v0 up");
     EXPECT_EQ(portNamed(inventoryOf(space), "v0").status, "Lost Comm");
     space.ip("link set v1 up");
+    waitForState(space, "v0", "UP");
     EXPECT_EQ(portNamed(inventoryOf(space), "v0").status, "OK");
 }
 
@@ -254,6 +269,27 @@ TEST(KernelInventory, SurvivesInterfacesThatComeAndGo) {
 
 std::string attribute(const NetworkPort& port, const std::string& name) {
     return Hardware::readAttribute("/sys/class/net/" + port.name + '/' + name).value_or("");
+}
+
+TEST(NetlinkSocket, ThrowsTheKernelsErrorAndIsUsableAfterwards) {
+    Hardware::NetlinkSocket socket(NETLINK_ROUTE);
+    Hardware::NetlinkRequest request(RTM_GETLINK, 0);
+    request.put<ifinfomsg>();
+    mnl_attr_put_strz(&request.message(), IFLA_IFNAME, "no-such-link");
+    try {
+        socket.ask(request, [](Hardware::Bytes) { ADD_FAILURE() << "an answer"; });
+        FAIL() << "no error";
+    } catch (const std::system_error& error) {
+        EXPECT_EQ(error.code(), std::errc::no_such_device) << error.what();
+    }
+    EXPECT_FALSE(Hardware::readLinks(socket).empty());
+}
+
+TEST(NetlinkSocket, PassesOnWhatTheHandlerThrows) {
+    Hardware::NetlinkSocket socket(NETLINK_ROUTE);
+    Hardware::NetlinkRequest request(RTM_GETLINK, NLM_F_DUMP);
+    request.put<ifinfomsg>();
+    EXPECT_THROW(socket.ask(request, [](Hardware::Bytes) { throw std::domain_error("enough"); }), std::domain_error);
 }
 
 TEST(HostInventory, NamesACardForEveryInterfaceThatSysfsShowsADeviceFor) {
