@@ -5,10 +5,10 @@
 #pragma once
 
 #include <array>
-#include <compare>
 #include <cstdint>
 #include <span>
 #include <string>
+#include <tuple>
 
 #include <sys/socket.h>
 
@@ -30,7 +30,12 @@ struct IpAddress {
     /** Dotted or RFC 5952 form; empty for none. */
     [[nodiscard]] std::string text() const;
 
-    auto operator<=>(const IpAddress&) const = default;
+    bool operator==(const IpAddress&) const = default;
+
+    /** Some order, for sets and maps. */
+    bool operator<(const IpAddress& other) const {
+        return std::tie(family, bytes) < std::tie(other.family, other.bytes);
+    }
 };
 
 /** The number of bytes of an address of this family; 0 for a family that is neither IPv4 nor IPv6. */

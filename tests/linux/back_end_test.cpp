@@ -1,8 +1,4 @@
-#include "agent/linux/LinuxBackEnd.h"
-#include "tests/linux/IpReport.h"
-#include "tests/linux/TemporaryHost.h"
-#include "tests/linux/TreeReading.h"
-#include "tests/support/Namespace.h"
+#include "tests/linux/BackEndFixture.h"
 
 #include <random>
 
@@ -18,56 +14,7 @@ using namespace NodeLexicon;
 using namespace Orv::Test;
 using testing::HasSubstr;
 
-/** A namespace, the files of a host, and a back end over both. */
-class LinuxBackEndTest : public testing::Test {
-  protected:
-    void SetUp() override {
-        REQUIRE_NAMESPACES();
-        space = std::make_unique<Namespace>();
-        // Duplicate address detection and addresses from nowhere would change what a test has set up.
-        space->shell("echo 0 > /proc/sys/net/ipv6/conf/default/accept_dad; "
-                     "echo 0 > /proc/sys/net/ipv6/conf/default/accept_ra");
-        backEnd = makeBackEnd();
-    }
-
-    [[nodiscard]] std::unique_ptr<BackEnd> makeBackEnd() const {
-        std::unique_ptr<BackEnd> made;
-        space->run([&] { made = makeLinuxBackEnd({host.root()}); });
-        return made;
-    }
-
-    /** Read on the test's own thread, which is in another namespace. */
-    [[nodiscard]] std::shared_ptr<const Tree> tree() const { return backEnd->snapshot(); }
-
-    void addPair(const std::string& name = "left", const std::string& peer = "right") const {
-        space->ip("link add " + name + " type veth peer name " + peer);
-        space->ip("link set " + name + " up");
-        space->ip("link set " + peer + " up");
-    }
-
-    void expectAgreement() const {
-        Report expected;
-        const auto same = [&] {
-            expected = ipReport(*space);
-            return kernelProperties(*tree()) == expected;
-        };
-        EXPECT_TRUE(awaited(true, same)) << "the tree:\n"
-                                         << toText(kernelProperties(*tree())) << "ip:\n"
-                                         << toText(expected);
-    }
-
-    void expectStatus(const std::string& name, unsigned status) const {
-        EXPECT_EQ(awaited(status, [&] { return numberOf(*tree(), name, PROP_STATUS); }), status) << name;
-    }
-
-    void expectIpv6(const std::string& name, const std::string& address) const {
-        EXPECT_EQ(awaited(address, [&] { return textOf(*tree(), name, PROP_IPV6_ADDRESS); }), address) << name;
-    }
-
-    TemporaryHost host;
-    std::unique_ptr<Namespace> space;
-    std::unique_ptr<BackEnd> backEnd;
-};
+class LinuxBackEndTest : public BackEndFixture {};
 
 TEST_F(LinuxBackEndTest, hasNoAdapterInANewNamespace) {
     EXPECT_EQ(adapterNames(*tree()), std::set<std::string>());
@@ -120,130 +67,6 @@ TEST_F(LinuxBackEndTest, tellsTheStatusOfEachAdapter) {
     expectStatus("left", 12);
     expectStatus("right", 5);
     expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, reportsThePrimaryGlobalAddressOfSeveral) {
-    addPair();
-    space->ip("addr add 169.254.7.7/16 dev left scope link");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_ADDRESS), "169.254.7.7");
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("addr add 192.0.2.11/24 dev left");
-    space->ip("addr add 198.51.100.1/31 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_ADDRESS), "192.0.2.10");
-    expectAgreement();
-    space->ip("addr del 192.0.2.10/24 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_ADDRESS), "198.51.100.1");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_SUBNET_MASK), "255.255.255.254");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, followsAnAddressThatIsPromoted) {
-    addPair();
-    space->shell("echo 1 > /proc/sys/net/ipv4/conf/left/promote_secondaries");
-    for (const char* address : {"192.0.2.10/24", "192.0.2.11/24", "198.51.100.1/24"}) {
-        space->ip(std::string("addr add ") + address + " dev left");
-    }
-    (void)tree();
-    space->ip("addr del 192.0.2.10/24 dev left");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, reportsTheOwnEndOfAPointToPointAddress) {
-    addPair();
-    space->ip("addr add 192.0.2.1 peer 192.0.2.2 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_ADDRESS), "192.0.2.1");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_IPV4_SUBNET_MASK), "255.255.255.255");
-    space->ip("addr add fd00::1 peer fd00::2 dev right");
-    expectIpv6("right", "fd00::1");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, reportsAGlobalIpv6AddressBeforeALinkLocalOne) {
-    addPair();
-    EXPECT_EQ(awaited(2U, [&] { return numberOf(*tree(), "left", PROP_IP_SUPPORT); }), 2U);
-    EXPECT_THAT(textOf(*tree(), "left", PROP_IPV6_ADDRESS), HasSubstr("fe80::"));
-    space->ip("addr add 2001:db8::1/64 dev left");
-    space->ip("addr add 2001:db8::2/64 dev left");
-    expectAgreement();
-    backEnd = makeBackEnd();
-    expectAgreement();
-    space->ip("addr change 2001:db8::2/64 dev left preferred_lft 0");
-    expectIpv6("left", "2001:db8::1");
-}
-
-TEST_F(LinuxBackEndTest, reportsTheGatewayOfTheLowestMetric) {
-    addPair();
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("route add default via 192.0.2.3 dev left metric 300");
-    space->ip("route add default via 192.0.2.1 dev left metric 100");
-    space->ip("route add default via 192.0.2.2 dev left metric 200");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    space->ip("route del default via 192.0.2.1 dev left metric 100");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.2");
-    space->ip("route replace default via 192.0.2.9 dev left metric 200");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.9");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, reportsEachHopOfARouteThroughSeveralAdapters) {
-    addPair();
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("addr add 198.51.100.10/24 dev right");
-    space->ip("route add default nexthop via 192.0.2.1 dev left nexthop via 198.51.100.1 dev right");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    EXPECT_EQ(textOf(*tree(), "right", PROP_DEFAULT_GATEWAY), "198.51.100.1");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, reportsAnIpv6GatewayWhereThereIsNoOther) {
-    addPair();
-    space->ip("addr add fd00::10/64 dev left");
-    space->ip("-6 route add default via fd00::1 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "fd00::1");
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("route add default dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "fd00::1");
-    space->ip("route replace default via 192.0.2.1 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, takesNoGatewayFromOtherTables) {
-    addPair();
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("route add default via 192.0.2.1 dev left table 100");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "");
-}
-
-TEST_F(LinuxBackEndTest, losesTheGatewayThatTheKernelWithdrawsSilently) {
-    addPair();
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("route add default via 192.0.2.1 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    space->ip("link set left down");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "");
-    space->ip("link set left up");
-    space->ip("route add default via 192.0.2.1 dev left src 192.0.2.10");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    space->ip("addr del 192.0.2.10/24 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "");
-    expectAgreement();
-}
-
-TEST_F(LinuxBackEndTest, passesOverAGatewayThatCannotBeReached) {
-    addPair();
-    space->ip("addr add 192.0.2.10/24 dev left");
-    space->ip("route add default via 192.0.2.1 dev left");
-    space->ip("route append default via 192.0.2.2 dev left");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
-    // A packet to a host that does not answer: the kernel gives it up after one unanswered question.
-    space->shell("cd /proc/sys/net/ipv4/neigh/left && echo 1 > mcast_solicit && echo 50 > retrans_time_ms && "
-                 "bash -c 'echo > /dev/udp/192.0.2.1/9' && "
-                 "until ip neigh show dev left | grep -q '192.0.2.1.*FAILED'; do sleep 0.05; done");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.2");
-    EXPECT_EQ(textOf(*makeBackEnd()->snapshot(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.2");
-    space->ip("neigh replace 192.0.2.1 lladdr 02:00:00:00:00:01 dev left nud reachable");
-    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
 }
 
 TEST_F(LinuxBackEndTest, followsARename) {

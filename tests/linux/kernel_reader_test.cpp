@@ -220,6 +220,17 @@ TEST(LinuxBackEnd, readsANamespaceInWhichInterfacesVanish) {
     EXPECT_TRUE(awaited(true, [&] { return kernelProperties(*backEnd->snapshot()) == ipReport(space); }));
 }
 
+TEST(KernelReader, followsTenThousandInterfacesAsTheyCome) {
+    REQUIRE_NAMESPACES();
+    const Namespace space;
+    const auto follower = readerIn(space, KernelReader::usualReceiveBytes);
+    space.ipBatch(pairs(0, 5000));
+    EXPECT_EQ(follower->update().links().size(), 10001U);
+    EXPECT_EQ(follower->fullReads(), 1U) << "the queue is too short";
+    const auto reader = readerIn(space, KernelReader::usualReceiveBytes);
+    EXPECT_EQ(reader->update().links(), follower->update().links());
+}
+
 TEST(LinuxBackEnd, readsAThousandInterfaces) {
     REQUIRE_NAMESPACES();
     const Namespace space;
