@@ -53,6 +53,12 @@ std::optional<std::string> contentOf(const std::string& path, const std::optiona
 
 } // namespace
 
+std::string pathIn(std::string directory, const std::string& name) {
+    directory += '/';
+    directory += name;
+    return directory;
+}
+
 std::optional<FileStamp> HostFiles::look(const std::string& path) {
     // Before the reading, so that a change during it shows.
     std::string place = _root + path;

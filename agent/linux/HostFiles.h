@@ -14,6 +14,9 @@
 
 namespace Orv::Agent::Linux {
 
+/** The path of a file in a directory. */
+std::string pathIn(std::string directory, const std::string& name);
+
 /**
  * Reads files below a root and remembers what they looked like, so that one round of stat calls tells whether reading
  * them again would bring anything new. Paths are absolute, as the host has them. One thread at a time; nothing throws

@@ -84,7 +84,7 @@ class Reader {
     void readDirectory(const std::string& path, int depth) {
         for (const std::string& name : _files.list(path)) {
             if (isPlainName(name)) {
-                readFile(path + "/" + name, depth + 1);
+                readFile(pathIn(path, name), depth + 1);
             }
         }
     }

@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <array>
-#include <charconv>
 
 #include <fnmatch.h>
 
@@ -113,7 +112,7 @@ std::map<std::string, std::string> firstOfEach(const Directories& directories, s
     for (const auto& [directory, names] : directories) {
         for (const std::string& name : names) {
             if (name.ends_with(ending)) {
-                paths.try_emplace(name, directory + "/" + name);
+                paths.try_emplace(name, pathIn(directory, name));
             }
         }
     }
@@ -126,18 +125,11 @@ Directories dropInsOf(HostFiles& files, const Directories& directories, const st
     Directories found;
     for (const auto& [directory, names] : directories) {
         if (std::binary_search(names.begin(), names.end(), unit + ".d")) {
-            const std::string path = directory + "/" + unit + ".d";
+            const std::string path = pathIn(directory, unit + ".d");
             found.emplace_back(path, files.list(path));
         }
     }
     return found;
-}
-
-/** The number in a name of decimal digits, or 0. */
-int numberOf(const std::string& name) {
-    int number = 0;
-    const auto result = std::from_chars(name.data(), name.data() + name.size(), number);
-    return result.ptr == name.data() + name.size() ? number : 0;
 }
 
 /** The unit that networkd says it has applied, by path; empty when it leaves the interface alone. */
@@ -157,11 +149,11 @@ std::map<int, std::optional<std::size_t>> readAssigned(HostFiles& files,
                                                        const std::map<std::string, std::size_t>& unitByPath) {
     std::map<int, std::optional<std::size_t>> assigned;
     for (const std::string& name : files.list(linkStates)) {
-        const int index = numberOf(name);
-        const auto path = index > 0 ? appliedUnit(files.peek(std::string(linkStates) + "/" + name)) : std::nullopt;
+        const std::optional<int> index = positiveNumber(name);
+        const auto path = index ? appliedUnit(files.peek(pathIn(linkStates, name))) : std::nullopt;
         if (path) {
             const auto unit = unitByPath.find(*path);
-            assigned[index] = unit == unitByPath.end() ? std::nullopt : std::optional(unit->second);
+            assigned[*index] = unit == unitByPath.end() ? std::nullopt : std::optional(unit->second);
         }
     }
     return assigned;
@@ -230,7 +222,9 @@ Networkd readNetworkd(HostFiles& files) {
     }
     networkd.assigned = readAssigned(files, unitByPath);
     for (const std::string& name : files.list(leaseFiles)) {
-        networkd.leases.push_back(numberOf(name));
+        if (const std::optional<int> index = positiveNumber(name)) {
+            networkd.leases.push_back(*index);
+        }
     }
     std::sort(networkd.leases.begin(), networkd.leases.end());
     return networkd;

@@ -5,7 +5,6 @@
 
 #include <algorithm>
 #include <array>
-#include <charconv>
 #include <optional>
 
 #include <arpa/inet.h>
@@ -101,13 +100,6 @@ ResolverSettings parseLinkState(std::string_view text) {
     return settings;
 }
 
-std::optional<int> indexOf(const std::string& name) {
-    int index = 0;
-    const char* end = name.data() + name.size();
-    const auto result = std::from_chars(name.data(), end, index);
-    return result.ec == std::errc() && result.ptr == end && index > 0 ? std::optional(index) : std::nullopt;
-}
-
 } // namespace
 
 ResolverSettings parseResolvConf(std::string_view text) {
@@ -135,8 +127,8 @@ std::map<int, ResolverSettings> readLinkResolvers(HostFiles& files) {
     // interface, need not be looked at. What is set by hand for systemd-resolved stands above networkd's.
     for (const std::string directory : {networkdLinks, resolvedLinks}) {
         for (const std::string& name : files.list(directory)) {
-            const std::optional<int> index = indexOf(name);
-            ResolverSettings link = index ? parseLinkState(files.peek(directory + "/" + name)) : ResolverSettings();
+            const std::optional<int> index = positiveNumber(name);
+            ResolverSettings link = index ? parseLinkState(files.peek(pathIn(directory, name))) : ResolverSettings();
             if (link != ResolverSettings()) {
                 settings[*index] = std::move(link);
             }

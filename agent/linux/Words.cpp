@@ -1,5 +1,8 @@
 #include "agent/linux/Words.h"
 
+#include <charconv>
+#include <system_error>
+
 namespace Orv::Agent::Linux {
 
 namespace {
@@ -34,6 +37,13 @@ std::string_view trimmed(std::string_view text) {
         return {};
     }
     return text.substr(begin, text.find_last_not_of(blanks) - begin + 1);
+}
+
+std::optional<int> positiveNumber(std::string_view text) {
+    int number = 0;
+    const char* end = text.data() + text.size();
+    const auto result = std::from_chars(text.data(), end, number);
+    return result.ec == std::errc() && result.ptr == end && number > 0 ? std::optional(number) : std::nullopt;
 }
 
 } // namespace Orv::Agent::Linux

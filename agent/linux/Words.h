@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include <optional>
 #include <string_view>
 #include <vector>
 
@@ -17,5 +18,8 @@ std::vector<std::string_view> wordsOf(std::string_view line);
 
 /** The text without blanks, tabs and carriage returns at its ends. */
 std::string_view trimmed(std::string_view text);
+
+/** The number that a text of decimal digits is; none when it is not one above 0. */
+std::optional<int> positiveNumber(std::string_view text);
 
 } // namespace Orv::Agent::Linux
