@@ -552,16 +552,12 @@ TEST_F(FactoryInstances, RecordWhoseInstanceCannotBeMadeIsANullElement) {
 
 TEST_F(FactoryInstances, PathWithoutHandleCountsAsNone) {
     addAdapter("eth0");
-    setup.faulty.failNothing();
-    setup.faulty.changeable().eft = [&] {
-        static CMPIBrokerEncFT table;
-        table = *setup.faulty.handle()->eft;
-        table.newObjectPath = [](const CMPIBroker*, const char*, const char*, CMPIStatus*) {
-            static CMPIObjectPath hollow{nullptr, nullptr};
-            return &hollow;
-        };
-        return &table;
-    }();
+    CMPIBrokerEncFT table = *setup.faulty.handle()->eft;
+    table.newObjectPath = [](const CMPIBroker*, const char*, const char*, CMPIStatus*) {
+        static CMPIObjectPath hollow{nullptr, nullptr};
+        return &hollow;
+    };
+    setup.faulty.changeable().eft = &table;
     EXPECT_EQ(configuration().instances.at(0).path.className, NO_INSTANCE);
 }
 

@@ -43,6 +43,24 @@ class ReadBase {
         return found != counts.end() ? found->second : 0;
     }
 
+    /** The broker makes the second instance of a call without a handle. */
+    void loseHandleOfSecondInstance() {
+        static CMPIBrokerEncFT table;
+        static CMPIInstance* (*real)(const CMPIBroker*, const CMPIObjectPath*, CMPIStatus*);
+        static int made;
+        made = 0;
+        table = *setup.faulty.handle()->eft;
+        real = table.newInstance;
+        table.newInstance = [](const CMPIBroker* broker, const CMPIObjectPath* path, CMPIStatus* status) {
+            CMPIInstance* instance = real(broker, path, status);
+            if (++made == 2) {
+                instance->hdl = nullptr;
+            }
+            return instance;
+        };
+        setup.faulty.changeable().eft = &table;
+    }
+
     BrokerSetup setup;
     ProviderCalls calls{setup};
 };
@@ -212,29 +230,23 @@ TEST_P(ReadOperations, ClassThatTheProviderDoesNotProduceFailsWithoutDoneAndWith
     }
 }
 
-TEST_P(ReadOperations, EnumInstanceNamesAndGetInstanceSkipInstancesWithoutHandle) {
-    setup.faulty.changeable().eft = [&] {
-        static CMPIBrokerEncFT table;
-        static CMPIInstance* (*real)(const CMPIBroker*, const CMPIObjectPath*, CMPIStatus*);
-        static int made;
-        made = 0;
-        table = *setup.faulty.handle()->eft;
-        real = table.newInstance;
-        table.newInstance = [](const CMPIBroker* broker, const CMPIObjectPath* path, CMPIStatus* status) {
-            CMPIInstance* instance = real(broker, path, status);
-            if (++made == 2) {
-                instance->hdl = nullptr;
-            }
-            return instance;
-        };
-        return &table;
-    }();
+TEST_P(ReadOperations, EnumInstanceNamesSkipsInstancesWithoutHandle) {
+    loseHandleOfSecondInstance();
     EXPECT_THAT(calls.enumInstanceNames(GetParam()).paths, SizeIs(2));
-    EXPECT_EQ(count("result.returnObjectPath"), 2);
-    calls.enumInstances(GetParam());
+    EXPECT_EQ(count("instance.getObjectPath"), 2);
+}
+
+TEST_P(ReadOperations, GetInstanceSkipsInstancesWithoutHandle) {
+    loseHandleOfSecondInstance();
     script().isObjPathsEqual = [](const CMPIObjectPath*, const CMPIObjectPath*, bool) { return false; };
-    scripted_agent::clearRecord();
     calls.getInstance(GetParam(), pathOf(GetParam(), "eth1"));
+    EXPECT_EQ(count("instance.getObjectPath"), 2);
+}
+
+TEST_P(ReadOperations, EnumInstancesDoesNotLookAtHandles) {
+    loseHandleOfSecondInstance();
+    EXPECT_THAT(calls.enumInstances(GetParam()).instances, SizeIs(2));
+    EXPECT_EQ(count("result.returnInstance"), 3);
 }
 
 TEST_P(ReadOperations, WithoutAMemoryTableEverythingIsAnswered) {

@@ -108,7 +108,9 @@ struct Instrumentation::State {
 
     template <typename Value>
     bool read(NodeLexicon::Properties property, Value& value) const {
-        const std::string call = announced([&] { return "getProperty(" + nameOf(property) + ")"; });
+        const std::string call = announced([&] {
+            return "getProperty(" + nameOf(property) + ")" + (value == Value{} ? "" : " over " + shown(value));
+        });
         auto& properties = propertiesOf(node(), value);
         const auto found = properties.find(property);
         told(call, [&] { return found != properties.end() ? shown(found->second) : "absent"; });

@@ -9,9 +9,12 @@
  *     cursor 1: selectNode(NODE_NETWORK_ADAPTER)
  *     cursor 1: bool = true
  *     cursor 1: getProperty(PROP_STATUS) = 1
+ *     cursor 1: getProperty(PROP_MAC_ADDRESS) over "stale" = absent
  *     stripSpaces("OK") = "OK"
  *     buffer << "..."
  *     log 4000 Hearth.NetworkAdapterProvider NetworkAdapterConfiguration:57 getNicStatus | text
+ *
+ * The `over` part is there when the caller's variable was not empty.
  *
  * A script is set up while no provider call is running; recording is safe from any thread.
  */
