@@ -69,6 +69,7 @@ CMPIStatus LogicalNetworkAdapter_ExecQuery(CMPIInstanceMI* /*mi*/, const CMPICon
 
 namespace {
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the usual name of a CMPI table
 const CMPIInstanceMIFT instMIFT__ = {
     MI_VERSION,
     MI_VERSION,

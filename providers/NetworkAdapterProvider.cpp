@@ -134,6 +134,7 @@ CMPIStatus NetworkAdapter_DeActivateFilterCollection(CMPIIndicationMI* /*mi*/, c
 
 namespace {
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the usual name of a CMPI table
 const CMPIInstanceMIFT instMIFT__ = {
     MI_VERSION,
     MI_VERSION,
@@ -148,10 +149,12 @@ const CMPIInstanceMIFT instMIFT__ = {
     NetworkAdapter_ExecQuery,
 };
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the usual name of a CMPI table
 const CMPIMethodMIFT methMIFT__ = {
     MI_VERSION, MI_VERSION, "methodNetworkAdapterProvider", NetworkAdapter_MethodCleanup, NetworkAdapter_InvokeMethod,
 };
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the usual name of a CMPI table
 const CMPIIndicationMIFT indMIFT__ = {
     MI_VERSION,
     MI_VERSION,

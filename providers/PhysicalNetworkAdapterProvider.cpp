@@ -72,6 +72,7 @@ CMPIStatus PhysicalNetworkAdapter_ExecQuery(CMPIInstanceMI* /*mi*/, const CMPICo
 
 namespace {
 
+// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the usual name of a CMPI table
 const CMPIInstanceMIFT instMIFT__ = {
     MI_VERSION,
     MI_VERSION,
