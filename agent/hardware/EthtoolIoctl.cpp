@@ -75,7 +75,7 @@ std::optional<LinkSettings> EthtoolIoctl::linkSettings(const std::string& interf
     if (!this->request(interface, &request) || head.link_mode_masks_nwords <= 0) {
         return std::nullopt;
     }
-    const auto words = static_cast<std::size_t>(head.link_mode_masks_nwords);
+    const std::size_t words = static_cast<std::uint8_t>(head.link_mode_masks_nwords);
     return settingsFrom(head, std::span<const std::uint32_t>(request.bitmaps).first(words));
 }
 

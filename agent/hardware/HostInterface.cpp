@@ -1,7 +1,6 @@
 #include "agent/hardware/HostInterface.h"
 
 #include <algorithm>
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -15,6 +14,14 @@ constexpr std::uint8_t networkInterface = 0x40;
 
 /** Device types of DSP0270. Version 2 descriptors start with their own length. */
 enum DescriptorType : std::uint8_t { UsbVersion1 = 2, PciVersion1 = 3, UsbVersion2 = 4, PciVersion2 = 5 };
+
+std::string hexadecimal(unsigned value, std::size_t width) {
+    std::string text(width, '0');
+    for (auto digit = text.rbegin(); digit != text.rend(); ++digit, value >>= 4U) {
+        *digit = "0123456789abcdef"[value & 0xfU];
+    }
+    return text;
+}
 
 /** Little-endian fields at fixed places; the caller has checked the size. */
 struct Fields {
@@ -32,19 +39,22 @@ struct Fields {
         return value == 0 || value == 0xffff ? std::nullopt : std::optional(value);
     }
 
+    /** Empty for an address of zeros, which is none. */
     [[nodiscard]] std::string macAddress(std::size_t at) const {
-        std::array<char, 18> text{};
-        std::snprintf(text.data(), text.size(), "%02x:%02x:%02x:%02x:%02x:%02x", octet(at), octet(at + 1),
-                      octet(at + 2), octet(at + 3), octet(at + 4), octet(at + 5));
-        return text.data() == std::string("00:00:00:00:00:00") ? "" : text.data();
+        std::string text = hexadecimal(octet(at), 2);
+        bool none = octet(at) == 0;
+        for (std::size_t i = 1; i < 6; ++i) {
+            text += ':' + hexadecimal(octet(at + i), 2);
+            none = none && octet(at + i) == 0;
+        }
+        return none ? "" : text;
     }
 
+    /** Segment, bus, and device and function in one octet. */
     [[nodiscard]] std::string pciAddress(std::size_t at) const {
-        std::array<char, 16> text{};
-        const unsigned function = octet(at + 3);
-        std::snprintf(text.data(), text.size(), "%04x:%02x:%02x.%u", word(at), octet(at + 2), function >> 3U,
-                      function & 7U);
-        return text.data();
+        const unsigned place = octet(at + 3);
+        return hexadecimal(word(at), 4) + ':' + hexadecimal(octet(at + 2), 2) + ':' + hexadecimal(place >> 3U, 2) +
+               '.' + hexadecimal(place & 7U, 1);
     }
 };
 
