@@ -60,7 +60,7 @@ class FileBackEnd : public BackEnd {
         const std::size_t hash = std::hash<std::string>()(file.text);
         const bool same = _last.tree != nullptr && file.stamp == _last.stamp && hash == _last.textHash;
         std::shared_ptr<const Tree> tree = same ? _last.tree : nullptr;
-        _last = {}; // whatever is thrown from here on, the former state is not served again
+        _last = {}; // its memory serves for the next one, if no cursor holds the tree
         if (tree == nullptr) {
             tree = parseTree(file.text, _path);
         }
