@@ -45,12 +45,6 @@ class TemporaryFile {
 
     void remove() const { std::filesystem::remove(_path); }
 
-    /** Makes the file look written long ago, so that its stamp can be trusted. */
-    void age() const {
-        std::filesystem::last_write_time(_path,
-                                         std::filesystem::file_time_type::clock::now() - std::chrono::hours(1));
-    }
-
     [[nodiscard]] std::string read() const { return readFrom(_path); }
 
     [[nodiscard]] std::string path() const { return _path.string(); }

@@ -1,11 +1,17 @@
+#include "agent/config/TextFile.h"
 #include "agent/file/FileBackEnd.h"
 #include "tests/agent/TemporaryFile.h"
 
 #include <atomic>
+#include <chrono>
+#include <filesystem>
 #include <thread>
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
 
 namespace {
 
@@ -29,6 +35,11 @@ std::string firstIdentity(const Tree& tree) {
     return tree.nodesOfType(NODE_NETWORK_ADAPTER).at(0)->description;
 }
 
+/** Waits until a file written just now can be trusted to be seen changed. */
+void settle() {
+    std::this_thread::sleep_for(std::chrono::milliseconds(200));
+}
+
 struct FileBackEndTest : testing::Test {
     std::string identityNow() { return firstIdentity(*backEnd->snapshot()); }
 
@@ -41,7 +52,7 @@ struct FileBackEndTest : testing::Test {
 };
 
 TEST_F(FileBackEndTest, GivesTheSameTreeWhileTheFileIsTheSame) {
-    file.age();
+    settle();
     const auto first = backEnd->snapshot();
     EXPECT_EQ(backEnd->snapshot(), first);
     EXPECT_EQ(backEnd->snapshot(), first);
@@ -59,7 +70,6 @@ TEST_F(FileBackEndTest, SeesAFileWrittenInPlace) {
 }
 
 TEST_F(FileBackEndTest, SeesEveryOneOfManyQuickWritesOfOneLength) {
-    // All within one step of the kernel's file clock: neither the time nor the size tells them apart.
     for (int i = 0; i < 200; ++i) {
         const std::string identity = "eth" + std::to_string(100 + i);
         file.write(adapters(identity));
@@ -67,8 +77,65 @@ TEST_F(FileBackEndTest, SeesEveryOneOfManyQuickWritesOfOneLength) {
     }
 }
 
+/** A file as memory: stores to a page that is dirty already leave the times of the file alone. */
+class MappedFile {
+  public:
+    explicit MappedFile(const std::string& path) : _size(std::filesystem::file_size(path)) {
+        const int descriptor = ::open(path.c_str(), O_RDWR | O_CLOEXEC);
+        _bytes = static_cast<char*>(::mmap(nullptr, _size, PROT_READ | PROT_WRITE, MAP_SHARED, descriptor, 0));
+        ::close(descriptor);
+    }
+
+    ~MappedFile() { ::munmap(_bytes, _size); }
+
+    MappedFile(const MappedFile&) = delete;
+    MappedFile& operator=(const MappedFile&) = delete;
+
+    void put(std::size_t offset, char byte) { _bytes[offset] = byte; }
+
+  private:
+    std::size_t _size;
+    char* _bytes;
+};
+
+TEST_F(FileBackEndTest, SeesAWriteWithinOneStepOfTheFileClock) {
+    const std::size_t digit = adapters("eth").size() - 2;
+    for (int attempt = 0; attempt < 100; ++attempt) {
+        file.write(adapters("eth0"));
+        const auto start = std::chrono::steady_clock::now();
+        MappedFile mapped(file.path());
+        mapped.put(digit, '1');
+        const std::string first = identityNow();
+        const auto stamp = Orv::Agent::stampOf(file.path());
+        mapped.put(digit, '2');
+        const bool isWithin = std::chrono::steady_clock::now() - start < std::chrono::milliseconds(50);
+        if (isWithin && Orv::Agent::stampOf(file.path()) == stamp) {
+            EXPECT_EQ(first, "eth1");
+            EXPECT_EQ(identityNow(), "eth2");
+            return;
+        }
+    }
+    FAIL() << "no write was quick enough";
+}
+
+TEST(TextFile, IsSettledWhenItsLastWriteIsLongerAgoThanTheFileClockIsCoarse) {
+    const TemporaryFile file("text", "text");
+    const auto start = std::chrono::steady_clock::now();
+    const bool atOnce = Orv::Agent::readTextFile(file.path()).settled;
+    EXPECT_TRUE(!atOnce || std::chrono::steady_clock::now() - start > std::chrono::milliseconds(50));
+    settle();
+    EXPECT_TRUE(Orv::Agent::readTextFile(file.path()).settled);
+}
+
+TEST(TextFile, IsReadWholeWhateverItsLength) {
+    const std::string text(1000001, 'x');
+    for (const std::string& content : {std::string(), std::string(1, 'a'), text}) {
+        const TemporaryFile file("text", content);
+        EXPECT_EQ(Orv::Agent::readTextFile(file.path()).text, content);
+    }
+}
+
 TEST_F(FileBackEndTest, SeesAFileRenamedOntoItWithTheOldTime) {
-    file.age();
     EXPECT_EQ(identityNow(), "eth0");
     const auto time = std::filesystem::last_write_time(file.path());
     file.replace(adapters("eth1"));
@@ -104,7 +171,6 @@ TEST_F(FileBackEndTest, FailsWhileTheFileIsWrongAndServesNothingOfItsFormerState
 
 TEST_F(FileBackEndTest, FailsAgainThoughTheWrongFileLooksUnchanged) {
     file.write("[[adapter]]\nstatus = \"up\"\n");
-    file.age();
     EXPECT_NE(failure(), "nothing was thrown");
     EXPECT_NE(failure(), "nothing was thrown");
 }
@@ -176,7 +242,7 @@ TEST_F(FileBackEndTest, ServesManyThreadsWhileTheFileChanges) {
 
 TEST_F(FileBackEndTest, GivesAWarmSnapshotOfTenThousandNodesWithoutReadingThem) {
     file.write(adapters("eth0", 10000));
-    file.age();
+    settle();
     // Reading is a matter of tens of milliseconds each; ten thousand warm snapshots would take minutes if they read.
     const auto first = backEnd->snapshot();
     const auto start = std::chrono::steady_clock::now();
