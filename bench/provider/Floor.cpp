@@ -1,7 +1,7 @@
 #include "bench/provider/ProviderBench.h"
 #include "instrumentation/Instrumentation.h"
-#include "instrumentation/LumLog.h"
 #include "instrumentation/Utilities.h"
+#include "trace/Trace.h"
 
 #include <cmpimacs.h>
 
@@ -15,15 +15,10 @@ using namespace Orv::NodeLexicon;
 const std::string logger = "Hearth.NetworkAdapterProvider";
 constexpr const char* CLASS = "MARLO_NetworkAdapterConfiguration";
 
-/** The two lines of one event; the text is about as long as the provider's. */
+/** One event as the provider logs it: formatted and handed over twice, once for the log and once for the trace. */
 void logEvent() {
-    constexpr const char* text =
-        "VARIABLE: 'ipAddress' has Value '10.0.0.1' at line 100 in NetworkAdapterObjectFactory";
-    LumLog::LumMessageBuffer buffer;
-    buffer << text;
-    LumLog::LumLogger::logLevelMessage("function", "file", 1, logger, 4000, nullptr, 0, 0, buffer.str(buffer));
-    buffer << text;
-    LumLog::LumLogger::traceLevelMessage("function", "file", 1, logger, 4000, nullptr, 0, 0, buffer.str(buffer));
+    static const ProviderLog log(logger, "NetworkAdapterObjectFactory", "makeNetworkAdapterConfigurationInstance");
+    log.variable("ipAddress", "10.0.0.1");
 }
 
 void logEvents(int count) {
