@@ -55,9 +55,26 @@ void makeNamespaces() {
     check(unshare(CLONE_NEWNET | CLONE_NEWNS), "unshare(network, mounts)");
 }
 
+/**
+ * Only mount points can be made private, and the root directory of a chroot need not be one: it is bound onto itself
+ * then. "/.." leads onto a mount that covers the root directory, "/" does not.
+ */
+void makeMountsPrivate() {
+    if (mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0) {
+        return;
+    }
+    if (errno != EINVAL) {
+        fail("mount / private");
+    }
+    check(mount("/", "/", nullptr, MS_BIND | MS_REC, nullptr), "bind / onto itself");
+    check(chdir("/.."), "chdir /..");
+    check(chroot("."), "chroot");
+    check(mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr), "mount / private");
+}
+
 /** A sysfs shows the network namespace in which it was mounted, so the new one needs a sysfs of its own. */
 void mountOwnSys() {
-    check(mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr), "mount / private");
+    makeMountsPrivate();
     check(mount("sysfs", "/sys", "sysfs", 0, nullptr), "mount sysfs");
 }
 
@@ -87,6 +104,8 @@ Namespace::Namespace() {
         mountOwnSys();
         _network = openNamespace("net");
         _mounts = openNamespace("mnt");
+        _root = open("/", O_PATH | O_DIRECTORY | O_CLOEXEC);
+        check(_root, "/");
     });
     std::string name = (std::filesystem::temp_directory_path() / "marlo-namespace-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr) {
@@ -98,6 +117,7 @@ Namespace::Namespace() {
 Namespace::~Namespace() {
     close(_network);
     close(_mounts);
+    close(_root);
     std::error_code ignored;
     std::filesystem::remove_all(_files, ignored);
 }
@@ -106,6 +126,9 @@ void Namespace::enter() const {
     // A thread enters a mount namespace only when it shares its root and working directory with no other thread.
     check(unshare(CLONE_FS), "unshare(fs)");
     check(setns(_mounts, CLONE_NEWNS), "setns(mounts)");
+    // It arrives in the root directory of the namespace, which is not this process's own in a chroot.
+    check(fchdir(_root), "fchdir(root)");
+    check(chroot("."), "chroot");
     check(setns(_network, CLONE_NEWNET), "setns(network)");
 }
 

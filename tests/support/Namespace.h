@@ -60,6 +60,7 @@ class Namespace {
   private:
     int _network = -1;
     int _mounts = -1;
+    int _root = -1;
     std::filesystem::path _files; ///< directory of the contents that replaceFile mounted
 };
 

@@ -44,13 +44,13 @@ TEST(Namespace, tellsWhyACommandFailed) {
 
 TEST(Namespace, replacesAFileInsideOnly) {
     REQUIRE_NAMESPACES();
-    const std::string outside = contentOf("/etc/hosts");
+    const std::string outside = contentOf("/etc/passwd");
     Namespace space;
-    space.replaceFile("/etc/hosts", "192.0.2.1 first\n");
-    EXPECT_EQ(space.shell("cat /etc/hosts"), "192.0.2.1 first\n");
-    space.replaceFile("/etc/hosts", "192.0.2.2 second\n");
-    EXPECT_EQ(space.shell("cat /etc/hosts"), "192.0.2.2 second\n");
-    EXPECT_EQ(contentOf("/etc/hosts"), outside);
+    space.replaceFile("/etc/passwd", "192.0.2.1 first\n");
+    EXPECT_EQ(space.shell("cat /etc/passwd"), "192.0.2.1 first\n");
+    space.replaceFile("/etc/passwd", "192.0.2.2 second\n");
+    EXPECT_EQ(space.shell("cat /etc/passwd"), "192.0.2.2 second\n");
+    EXPECT_EQ(contentOf("/etc/passwd"), outside);
 }
 
 TEST(Namespace, takesAnInterfaceFromAnother) {
