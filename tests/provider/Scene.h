@@ -63,4 +63,48 @@ inline std::vector<ReadCall> allReadCalls() {
     return all;
 }
 
+inline const std::string BANNER(78, '=');
+
+/** The scene, called through a broker whose calls are counted. */
+class ReadBase {
+  protected:
+    ReadBase() {
+        scripted_agent::reset();
+        addAdapters(setup);
+    }
+
+    static bool hasExitMark() {
+        const std::vector<std::string> lines = scripted_agent::recorded("log");
+        return lines.size() > 1 && lines.back().ends_with(BANNER) &&
+               lines[lines.size() - 2].find("markProviderExit | EXITING") != std::string::npos;
+    }
+
+    int count(const std::string& slot) {
+        const auto counts = setup.faulty.counts();
+        const auto found = counts.find(slot);
+        return found != counts.end() ? found->second : 0;
+    }
+
+    /** The broker makes the second instance of a call without a handle. */
+    void loseHandleOfSecondInstance() {
+        static CMPIBrokerEncFT table;
+        static CMPIInstance* (*real)(const CMPIBroker*, const CMPIObjectPath*, CMPIStatus*);
+        static int made;
+        made = 0;
+        table = *setup.faulty.handle()->eft;
+        real = table.newInstance;
+        table.newInstance = [](const CMPIBroker* broker, const CMPIObjectPath* path, CMPIStatus* status) {
+            CMPIInstance* instance = real(broker, path, status);
+            if (++made == 2) {
+                instance->hdl = nullptr;
+            }
+            return instance;
+        };
+        setup.faulty.changeable().eft = &table;
+    }
+
+    BrokerSetup setup;
+    ProviderCalls calls{setup};
+};
+
 } // namespace provider_test
