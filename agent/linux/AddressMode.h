@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "agent/change/AdapterSettings.h"
 #include "agent/linux/HostFiles.h"
 
 #include <cstdint>
@@ -15,8 +16,7 @@
 
 namespace Orv::Agent::Linux {
 
-/** PROP_DHCP_ENABLED of an adapter. */
-enum class AddressMode : unsigned int { leased = 1, fixed = 3 };
+using Agent::AddressMode;
 
 /** What configuration files recognise an interface by. */
 struct InterfaceFacts {

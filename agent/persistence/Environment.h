@@ -1,0 +1,34 @@
+/**
+ * @file
+ * Where persistent configuration finds the host; tests put other places here.
+ */
+#pragma once
+
+#include <chrono>
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace Orv::Agent::Persistence {
+
+/** Which manager's configuration is written. */
+enum class ManagerChoice { automatic, ifupdown, networkd, none };
+
+/** Programs of the host that are run, by path; each with the arguments that come first. */
+struct Commands {
+    std::vector<std::string> ifup{"/sbin/ifup"};
+    std::vector<std::string> dhclient{"/sbin/dhclient"};
+    std::vector<std::string> dhcpcd{"/sbin/dhcpcd"};
+    std::vector<std::string> resolvconf{"/sbin/resolvconf"};
+    std::chrono::milliseconds patience{std::chrono::seconds(60)}; ///< for one command, DHCP's own waiting included
+};
+
+struct Environment {
+    std::string root;      ///< prefix of all files; empty for the host itself
+    std::string systemBus; ///< D-Bus address (sd_bus_set_address); empty: the host's own system bus
+    ManagerChoice choice = ManagerChoice::automatic;
+    Commands commands;
+    std::function<void(const std::string&)> report; ///< takes lines for the log; may be empty; any thread
+};
+
+} // namespace Orv::Agent::Persistence
