@@ -1,8 +1,8 @@
 #include "host/broker/Convert.h"
 
 #include "host/broker/BrokerState.h"
-#include "host/broker/DateTimeText.h"
 #include "host/broker/Values.h"
+#include "host/model/DateTimeText.h"
 
 namespace marlo::broker {
 

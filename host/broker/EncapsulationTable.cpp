@@ -4,11 +4,11 @@
  */
 #include "host/broker/BrokerState.h"
 #include "host/broker/Convert.h"
-#include "host/broker/DateTimeText.h"
 #include "host/broker/Message.h"
 #include "host/broker/Slot.h"
 #include "host/broker/Unsupported.h"
 #include "host/broker/Values.h"
+#include "host/model/DateTimeText.h"
 
 #include <chrono>
 

@@ -1,6 +1,6 @@
 #include "host/cimom/ClassChecks.h"
 
-#include "host/broker/DateTimeText.h"
+#include "host/model/DateTimeText.h"
 
 #include <algorithm>
 #include <limits>
@@ -72,7 +72,7 @@ std::optional<Value> convertInteger(const Value& value, CMPIType type, const Int
 
 std::optional<Value> convertText(const std::string& text, CMPIType type) {
     if (type == CMPI_dateTime) {
-        return broker::readDateTime(text) ? std::optional(Value{type, DateTime{text}}) : std::nullopt;
+        return readDateTime(text) ? std::optional(Value{type, DateTime{text}}) : std::nullopt;
     }
     if (type != CMPI_ref) {
         return std::nullopt;

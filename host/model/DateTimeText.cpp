@@ -1,10 +1,10 @@
-#include "host/broker/DateTimeText.h"
+#include "host/model/DateTimeText.h"
 
 #include <array>
 #include <chrono>
 #include <cstdio>
 
-namespace marlo::broker {
+namespace marlo {
 
 namespace {
 
@@ -125,4 +125,4 @@ std::optional<std::string> writeDateTime(const DateTimeValue& value) {
                   static_cast<unsigned>(date.day()), hour, minute, second, micro);
 }
 
-} // namespace marlo::broker
+} // namespace marlo

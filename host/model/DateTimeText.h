@@ -9,7 +9,7 @@
 #include <string>
 #include <string_view>
 
-namespace marlo::broker {
+namespace marlo {
 
 struct DateTimeValue {
     std::uint64_t microseconds = 0; ///< since 1970-01-01T00:00:00Z, or of the interval
@@ -25,4 +25,4 @@ std::optional<DateTimeValue> readDateTime(std::string_view text);
 /** Date-times come out in UTC. Nothing for what the text form cannot hold (years above 9999, days of 9 digits). */
 std::optional<std::string> writeDateTime(const DateTimeValue& value);
 
-} // namespace marlo::broker
+} // namespace marlo
