@@ -54,7 +54,8 @@ struct AdapterSettings {
 
 /**
  * The settings in force as an adapter node shows them. `ipv4` is always present; `leased` only where the node says
- * so. What is no IPv4 address, no mask, or an IPv6 gateway counts as absent, and so does an address without a mask.
+ * so. An address without any mask has that of its class. What is no IPv4 address counts as absent, a gateway of IPv6
+ * too, and so does an address whose mask is none.
  */
 AdapterSettings settingsOf(const PropertyMap& properties);
 

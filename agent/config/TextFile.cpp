@@ -1,5 +1,7 @@
 #include "agent/config/TextFile.h"
 
+#include "agent/config/Descriptor.h"
+
 #include <cerrno>
 #include <ctime>
 #include <optional>
@@ -8,7 +10,6 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 namespace Orv::Agent {
 
@@ -17,21 +18,6 @@ namespace {
 constexpr std::int64_t nanosecondsPerSecond = 1'000'000'000;
 constexpr std::int64_t stampStep = 100'000'000; ///< well above the steps in which any kernel's file times advance
 constexpr int maximumAttempts = 10;
-
-class Descriptor {
-  public:
-    explicit Descriptor(int number) : _number(number) {}
-
-    ~Descriptor() { ::close(_number); }
-
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-
-    [[nodiscard]] int number() const { return _number; }
-
-  private:
-    int _number;
-};
 
 [[noreturn]] void fail(const std::string& path, int error) {
     throw std::system_error(error, std::generic_category(), path + ": cannot be read");
@@ -109,7 +95,7 @@ TextFile readTextFile(const std::string& path) {
     for (int attempt = 0; attempt < maximumAttempts; ++attempt) {
         // O_NONBLOCK: opening a FIFO must not wait for a writer. Opened anew each time: it may have been replaced.
         const Descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
-        if (file.number() < 0) {
+        if (!file) {
             fail(path, errno);
         }
         if (auto read = tryRead(file, path)) {

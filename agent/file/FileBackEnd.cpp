@@ -1,9 +1,14 @@
 #include "agent/file/FileBackEnd.h"
 
+#include "agent/change/Resolve.h"
 #include "agent/config/TextFile.h"
+#include "agent/file/DescriptionChange.h"
 #include "agent/file/TreeFile.h"
+#include "agent/persistence/FileTransaction.h"
 
+#include <algorithm>
 #include <functional>
+#include <map>
 #include <mutex>
 #include <stdexcept>
 #include <utility>
@@ -12,20 +17,6 @@ namespace Orv::Agent {
 
 namespace {
 
-std::string textOf(const PropertyValue& value) {
-    if (const auto* number = std::get_if<unsigned int>(&value)) {
-        return std::to_string(*number);
-    }
-    if (const auto* text = std::get_if<std::string>(&value)) {
-        return '"' + *text + '"';
-    }
-    std::string list;
-    for (const std::string& element : std::get<std::vector<std::string>>(value)) {
-        list += (list.empty() ? "\"" : ", \"") + element + '"';
-    }
-    return '[' + list + ']';
-}
-
 /** What the last reading gave. */
 struct Reading {
     std::shared_ptr<const Tree> tree;
@@ -33,6 +24,19 @@ struct Reading {
     bool settled = false;
     std::size_t textHash = 0;
 };
+
+/** An adapter of a tree, and which one of the description's it is. */
+struct AdapterPlace {
+    Tree::NodePointer node; ///< null: there is none
+    std::size_t number = 0;
+};
+
+AdapterPlace placeOf(const Tree& tree, const std::string& path) {
+    const auto& adapters = tree.nodesOfType(NodeLexicon::NODE_NETWORK_ADAPTER);
+    const auto found = std::find_if(adapters.begin(), adapters.end(),
+                                    [&](const Tree::NodePointer& node) { return node->path == path; });
+    return {found == adapters.end() ? nullptr : *found, static_cast<std::size_t>(found - adapters.begin())};
+}
 
 class FileBackEnd : public BackEnd {
   public:
@@ -47,8 +51,21 @@ class FileBackEnd : public BackEnd {
     }
 
     void setProperty(const std::string& path, NodeLexicon::Properties property, const PropertyValue& value) override {
-        throw std::runtime_error(nameOf(path) + ": property " + std::to_string(property) + " cannot be set to " +
-                                 textOf(value) + ": the tree file " + _path + " is only read");
+        const std::lock_guard lock(_mutex);
+        const TextFile file = readTextFile(_path);
+        const AdapterPlace adapter = placeOf(*treeOf(file), path);
+        if (adapter.node == nullptr) {
+            throw ChangeError(path, property, value, "there is no such adapter in " + _path);
+        }
+        const std::string name = nameOf(*adapter.node);
+        const Resolution resolution =
+            resolve(name, property, value, settingsOf(adapter.node->properties), _pending[path]);
+        try {
+            write(file.text, adapter, resolution.wanted);
+        } catch (const std::exception& failure) {
+            throw ChangeError(name, property, value, failure.what());
+        }
+        _pending[path] = resolution.pending;
     }
 
   private:
@@ -67,20 +84,40 @@ class FileBackEnd : public BackEnd {
         _last = {std::move(tree), file.stamp, file.settled, hash};
     }
 
-    /** How people know the node: by its identity, else by its path. */
-    std::string nameOf(const std::string& path) {
-        const auto node = snapshot()->find(path);
-        if (node == nullptr) {
-            return path;
+    std::shared_ptr<const Tree> treeOf(const TextFile& file) {
+        const bool isLast = _last.tree != nullptr && file.stamp == _last.stamp &&
+                            std::hash<std::string>()(file.text) == _last.textHash;
+        return isLast ? _last.tree : parseTree(file.text, _path);
+    }
+
+    /** Makes the change in the file; does not touch a file that says so already. */
+    void write(const std::string& text, const AdapterPlace& adapter, const AdapterSettings& wanted) {
+        const std::vector<KeyEdit> edits = keyEdits(adapter.node->properties, wanted);
+        if (edits.empty()) {
+            return;
         }
-        const auto identity = node->properties.find(NodeLexicon::PROP_NODE_STRING);
-        const auto* text = identity == node->properties.end() ? nullptr : std::get_if<std::string>(&identity->second);
-        return text == nullptr ? path : *text;
+        const std::string changed = editAdapter(text, _path, adapter.number, edits);
+        // What cannot be read back as it was meant is better not written.
+        const AdapterPlace result = placeOf(*parseTree(changed, _path), adapter.node->path);
+        if (result.node == nullptr || !keyEdits(result.node->properties, wanted).empty()) {
+            throw std::runtime_error(_path + ": cannot be edited in the form that it has");
+        }
+        Persistence::FileTransaction transaction;
+        transaction.apply({{_path, text, changed}});
+        transaction.commit();
+    }
+
+    /** How people know the node: by its identity, else by its path. */
+    static std::string nameOf(const Node& node) {
+        const auto identity = node.properties.find(NodeLexicon::PROP_NODE_STRING);
+        const auto* text = identity == node.properties.end() ? nullptr : std::get_if<std::string>(&identity->second);
+        return text == nullptr ? node.path : *text;
     }
 
     const std::string _path;
     std::mutex _mutex;
     Reading _last;
+    std::map<std::string, PendingPair> _pending; ///< by path
 };
 
 } // namespace

@@ -45,9 +45,14 @@ class FileTransaction {
     void revert();
 
     /** What was applied stays. */
-    void commit() noexcept { _applied.clear(); }
+    void commit() noexcept {
+        _applied.clear();
+        _directories.clear();
+    }
 
   private:
+    void takeBack(std::size_t files, std::size_t directories, std::string& failures);
+
     FileEdits _applied;
     std::vector<std::string> _directories; ///< made for new files, outermost first
 };

@@ -18,7 +18,6 @@ namespace {
 using namespace Orv::NodeLexicon;
 using Orv::Agent::BackEnd;
 using Orv::Agent::makeFileBackEnd;
-using Orv::Agent::PropertyValue;
 using Orv::Agent::Tree;
 using Orv::Test::messageOf;
 using Orv::Test::TemporaryFile;
@@ -178,24 +177,6 @@ TEST_F(FileBackEndTest, FailsAgainThoughTheWrongFileLooksUnchanged) {
 TEST_F(FileBackEndTest, NeedsNoFileUntilItIsAsked) {
     const auto early = makeFileBackEnd((file.directory() / "later.toml").string());
     EXPECT_THAT(messageOf([&] { early->snapshot(); }), testing::HasSubstr("later.toml: cannot be read"));
-}
-
-struct RefusedWrite {
-    PropertyValue value;
-    const char* text;
-};
-
-TEST_F(FileBackEndTest, RefusesAWriteNamingNodePropertyValueAndCause) {
-    const std::string path = backEnd->snapshot()->nodesOfType(NODE_NETWORK_ADAPTER)[0]->path;
-    const RefusedWrite writes[] = {{7U, "7"},
-                                   {std::string("192.0.2.1"), "\"192.0.2.1\""},
-                                   {std::vector<std::string>{"a", "b"}, "[\"a\", \"b\"]"}};
-    for (const auto& [value, text] : writes) {
-        EXPECT_EQ(messageOf([&] { backEnd->setProperty(path, PROP_IPV4_ADDRESS, value); }),
-                  "eth0: property 25 cannot be set to " + std::string(text) + ": the tree file " + file.path() +
-                      " is only read");
-    }
-    EXPECT_EQ(file.read(), adapters("eth0"));
 }
 
 TEST_F(FileBackEndTest, NeverShowsHalfAFileThatIsReplacedWhileItIsRead) {
