@@ -86,6 +86,15 @@ CMPIInstance* Broker::newInstance(const Instance& instance) const {
     return &toObject(currentArena(), *_state, instance)->handle;
 }
 
+CMPIArgs* Broker::newArgs(const std::vector<NamedValue>& arguments) const {
+    Arena& arena = currentArena();
+    auto* object = ArgsObject::make(arena);
+    for (const NamedValue& argument : arguments) {
+        object->values.set(argument.name, toData(arena, *_state, argument.value));
+    }
+    return &object->handle;
+}
+
 void Broker::addEntry(CMPIContext* context, const std::string& name, const Value& value) const {
     auto* object = objectOf<ContextObject>(context);
     object->entries.set(name, toData(object->arena(), *_state, value));
@@ -97,6 +106,10 @@ ObjectPath Broker::toModel(const CMPIObjectPath& path) {
 
 Instance Broker::toModel(const CMPIInstance& instance) {
     return broker::toModel(*objectOf<InstanceObject>(&instance));
+}
+
+std::vector<NamedValue> Broker::toModel(const CMPIArgs& arguments) {
+    return broker::toModel(objectOf<ArgsObject>(&arguments)->values);
 }
 
 Value Broker::toModel(const CMPIData& data) {

@@ -85,12 +85,14 @@ class Broker {
     [[nodiscard]] CMPIContext* newContext() const;
     [[nodiscard]] CMPIObjectPath* newObjectPath(const ObjectPath& path) const;
     [[nodiscard]] CMPIInstance* newInstance(const Instance& instance) const;
+    [[nodiscard]] CMPIArgs* newArgs(const std::vector<NamedValue>& arguments) const;
     /** Sets an entry of a context. */
     void addEntry(CMPIContext* context, const std::string& name, const Value& value) const;
 
     /** What a good handle holds. */
     [[nodiscard]] static ObjectPath toModel(const CMPIObjectPath& path);
     [[nodiscard]] static Instance toModel(const CMPIInstance& instance);
+    [[nodiscard]] static std::vector<NamedValue> toModel(const CMPIArgs& arguments);
     [[nodiscard]] static Value toModel(const CMPIData& data);
 
   private:

@@ -87,15 +87,6 @@ Value::Variant variantOf(const CMPIData& data) {
     }
 }
 
-std::vector<NamedValue> toModel(const NamedList& list) {
-    std::vector<NamedValue> values;
-    values.reserve(list.size());
-    for (const NamedData& entry : list) {
-        values.push_back({std::string(entry.name->text()), broker::toModel(entry.data)});
-    }
-    return values;
-}
-
 void setUnsigned(CMPIData& data, std::uint64_t number) {
     switch (data.type) {
     case CMPI_uint8:
@@ -224,6 +215,15 @@ Value toModel(const CMPIData& data) {
         return Value::null(data.type);
     }
     return {data.type, variantOf(data)};
+}
+
+std::vector<NamedValue> toModel(const NamedList& list) {
+    std::vector<NamedValue> values;
+    values.reserve(list.size());
+    for (const NamedData& entry : list) {
+        values.push_back({std::string(entry.name->text()), broker::toModel(entry.data)});
+    }
+    return values;
 }
 
 ObjectPath toModel(const ObjectPathObject& path) {

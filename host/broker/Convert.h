@@ -11,6 +11,7 @@ namespace marlo::broker {
 
 Value toModel(const CMPIData& data);
 ObjectPath toModel(const ObjectPathObject& path);
+std::vector<NamedValue> toModel(const NamedList& list);
 /** With the completed path. */
 Instance toModel(const InstanceObject& object);
 

@@ -197,5 +197,20 @@ TEST_F(Values, KeepTheirOrderWhenThereAreMany) {
     }
 }
 
+TEST_F(Values, ArgumentsGoToTheirObjectAndBackInOrder) {
+    const std::vector<NamedValue> given{
+        {"Text", Value::string("text")},
+        {"List", {CMPI_stringA, Value::Array{Value::string("a"), Value::null(CMPI_string)}}},
+        {"Nothing", Value::null(CMPI_stringA)},
+        {"Number", Value::uint(CMPI_uint16, 7)}};
+    const CMPIArgs* args = broker.newArgs(given);
+    EXPECT_EQ(CMGetArgCount(args, &status), 4U);
+    EXPECT_EQ(text(CMGetArg(args, "TEXT", &status).value.string), "text");
+    const CMPIData nothing = CMGetArg(args, "Nothing", &status);
+    EXPECT_EQ(nothing.type, CMPI_stringA);
+    EXPECT_NE(nothing.state & CMPI_nullValue, 0);
+    EXPECT_EQ(broker::Broker::toModel(*args), given);
+}
+
 } // namespace
 } // namespace marlo::test
