@@ -1,6 +1,6 @@
 #include "configuration/ConfigurationInventory.h"
 
-#include "instrumentation/Instrumentation.h"
+#include "configuration/AdapterNodes.h"
 #include "trace/Trace.h"
 
 #include <iostream>
@@ -77,14 +77,6 @@ void expect(bool accepted, const char* failure, const ProviderLog& log, unsigned
     }
 }
 
-/** Which device the node belongs to. */
-std::string grandparentDescription(Instrumentation& node) {
-    Instrumentation ancestor;
-    ancestor.selectNode(node.getPathToParentNode());
-    ancestor.selectNode(ancestor.getPathToParentNode());
-    return ancestor.getNodeDescription();
-}
-
 void readStatus(Instrumentation& node, Record& record) {
     unsigned int code = 0;
     if (node.getProperty(NodeLexicon::PROP_STATUS, code)) {
@@ -100,7 +92,7 @@ bool readIdentity(Instrumentation& node, Record& record, std::string& key, const
     require(record.setSettingID(key), "Failed while setting SettingID.");
     const std::string description = grandparentDescription(node);
     log.variable("nodeString", description);
-    return description != "BMC";
+    return description != MANAGEMENT_CONTROLLER;
 }
 
 void readAddresses(NodeReader& reader) {

@@ -1,5 +1,6 @@
 #include "configuration/NetworkAdapterConfiguration.h"
 
+#include "configuration/AdapterNodes.h"
 #include "instrumentation/Utilities.h"
 
 #include <utility>
@@ -12,7 +13,6 @@ namespace {
 constexpr unsigned int STATUS_OK = 1;
 constexpr unsigned int STATUS_STOPPED = 5;
 constexpr unsigned int STATUS_LOST_COMMUNICATION = 12;
-constexpr unsigned short ASSIGNMENT_DHCP = 1;
 
 void append(std::vector<std::string>& list, const std::vector<std::string>& more) {
     list.insert(list.end(), more.begin(), more.end());

@@ -63,6 +63,29 @@ class NetworkAdapterConfiguration {
     /** Accepts the code and keeps nothing: no class reports it. */
     bool setIPSupport(unsigned short value);
 
+    /*
+     * Changes: each writes to the adapter's node in the instrumentation tree, which the agent applies to the host,
+     * and then into this record. Node and argument are compared byte for byte, so that a node whose identity has
+     * spaces is out of reach of a SettingID, which has none; of several nodes with one identity the first is changed.
+     * All return 0 when they ran to their end, whether or not there was such a node, and 1 when the agent threw: what
+     * had been written until then stays, here and there. None of them throws anything derived from `std::exception`.
+     */
+
+    /** Has the adapter take its address from a DHCP server. */
+    int executeDHCPChanges(std::string settingID);
+    /** Switches the adapter to a fixed address, and writes those of address and mask that are not empty. */
+    int executeStaticChanges(std::string settingID, std::string ipAddress, std::string subnetMask);
+    /** Makes `gateway` the only default gateway; nothing happens when it is empty. */
+    int executeGatewayChanges(std::string settingID, std::string gateway);
+    /** Sets the DNS domain; nothing happens when it is empty. */
+    int executeDNSDomainChanges(std::string settingID, std::string dnsDomain);
+    /**
+     * Writes those of the two lists that are not empty, to the first adapter that is not the management controller's:
+     * the name service is the host's, whatever record this is. The lists are appended to the record's own, which
+     * shows the former entries as well until it is read anew.
+     */
+    int executeDNSChanges(std::vector<std::string> dnsServers, std::vector<std::string> dnsSuffixes);
+
   private:
     std::string _settingID;
     std::string _ipv4Address;

@@ -39,6 +39,18 @@ struct CopiedProperty {
 /** The characters of a broker's string; null for no string. Good until the provider call ends. */
 const char* characters(const CMPIString* text);
 
+/** The same as a text; empty for no string. */
+std::string textOf(const CMPIString* text);
+
+/** The text of a string value; empty for NULL and for a value of another type. */
+std::string textOf(const CMPIData& data);
+
+/** The path as the broker writes it; empty for no path. */
+std::string pathText(const CMPIObjectPath* path, CMPIStatus* status);
+
+/** The text of an element of an array of strings; empty for one that is NULL or not there. */
+std::string elementOf(const CMPIArray* array, CMPICount index, CMPIStatus* status);
+
 /**
  * A path of `className` in the namespace of `reference` on this system, without keys; null when the broker could not
  * make one. A path whose handle is null counts as none.

@@ -27,6 +27,24 @@ const char* characters(const CMPIString* text) {
     return text != nullptr ? CMGetCharPtr(text) : nullptr;
 }
 
+std::string textOf(const CMPIString* text) {
+    const char* found = characters(text);
+    return found != nullptr ? found : "";
+}
+
+std::string textOf(const CMPIData& data) {
+    const bool isText = (data.state & CMPI_nullValue) == 0 && data.type == CMPI_string;
+    return isText ? textOf(data.value.string) : "";
+}
+
+std::string pathText(const CMPIObjectPath* path, CMPIStatus* status) {
+    return path != nullptr ? textOf(CMObjectPathToString(path, status)) : "";
+}
+
+std::string elementOf(const CMPIArray* array, CMPICount index, CMPIStatus* status) {
+    return array != nullptr ? textOf(CMGetArrayElementAt(array, index, status)) : "";
+}
+
 CMPIObjectPath* makeObjectPath(const CMPIBroker* broker, const CMPIObjectPath* reference, const char* className) {
     const char* nameSpace = characters(CMGetNameSpace(reference, nullptr));
     CMPIObjectPath* path = CMNewObjectPath(broker, nameSpace, className, nullptr);

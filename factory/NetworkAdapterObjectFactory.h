@@ -7,9 +7,14 @@
 #include "configuration/ConfigurationInventory.h"
 
 #include <cstdint>
+#include <optional>
 #include <vector>
 
 #include <cmpift.h>
+
+namespace Orv {
+class ProviderLog;
+}
 
 namespace Orv::NetworkAdapterComposite {
 
@@ -74,7 +79,46 @@ class NetworkAdapterObjectFactory {
                                                           NetworkAdapterConfiguration record, const char** properties,
                                                           bool flag, CMPIStatus* status);
 
+    /**
+     * Writes IPv4Address, SubnetMask and DefaultIPGateway (the first element of each array counts) and DNSDomain of
+     * `instance` to the adapter that the key SettingID of `reference` names. A property that is missing, NULL or
+     * empty changes nothing; `properties` restricts nothing. Returns 0 for success and 1 when the values could not be
+     * written. `status` ends as the last call on the instance left it, which is the reading of DNSDomain.
+     */
+    int modifyNetworkAdapterCMPIInstance(const CMPIBroker* broker, const CMPIContext* context,
+                                         const CMPIObjectPath* reference, const char** properties, bool flag,
+                                         const CMPIInstance* instance, CMPIStatus* status);
+
+    /*
+     * The methods of MARLO_NetworkAdapterConfiguration. `settingID` is looked up among the keys of the inventory,
+     * byte for byte; what is changed is a copy of the record found there and, through it, the adapter. They return 0
+     * for success and 1 for a failure, which is logged. An argument of another type than the method has counts as not
+     * given.
+     */
+
+    /** Has the adapter take its address from a DHCP server. */
+    int executeDHCPChanges(std::string settingID);
+    /**
+     * Sets the first elements of the string arrays IPAddress and SubnetMask. The two go to the record in the order
+     * mask, address: which of them is which is told by their values.
+     */
+    int executeStaticChanges(std::string settingID, const CMPIArgs* args);
+    /** Sets the first element of the string array DefaultIPGateway. */
+    int executeGatewayChanges(std::string settingID, const CMPIArgs* args);
+    /**
+     * For a known adapter sets the text DNSDomain when the method is SetDNSDomain, and an empty domain, which changes
+     * nothing, for any other. Without a known adapter sets the lists: the string array DNSServerSearchOrder for
+     * SetDNSServerSearchOrder, DNSDomainSuffixSearchOrder for SetDNSSuffixSearchOrder. No arguments are a failure.
+     */
+    int executeDNSChanges(std::string settingID, const CMPIArgs* args, const char* methodName);
+    /** Restarts the host's networking and waits for it. Always 0: a restart that cannot be begun is only logged. */
+    int executeRestartNetwork();
+
   private:
+    /** The record under a SettingID; none, and why in the log, when there is none. */
+    [[nodiscard]] std::optional<NetworkAdapterConfiguration>
+    copyOfRecord(const ProviderLog& log, const std::string& settingID, const char* unknown) const;
+
     std::uint32_t numberOfInstances = 0;
     NetworkAdapterConfigurationMap _networkAdapterConfigurationMap;
 };

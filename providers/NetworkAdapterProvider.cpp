@@ -4,6 +4,7 @@
  */
 #include "providers/ProviderExport.h"
 #include "providers/ReadOperations.h"
+#include "providers/WriteOperations.h"
 
 namespace Orv::NetworkAdapterComposite {
 
@@ -48,10 +49,11 @@ CMPIStatus NetworkAdapter_CreateInstance(CMPIInstanceMI* /*mi*/, const CMPIConte
     return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
 }
 
-CMPIStatus NetworkAdapter_ModifyInstance(CMPIInstanceMI* /*mi*/, const CMPIContext* /*context*/,
-                                         const CMPIResult* /*result*/, const CMPIObjectPath* /*reference*/,
-                                         const CMPIInstance* /*instance*/, const char** /*properties*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+CMPIStatus NetworkAdapter_ModifyInstance(CMPIInstanceMI* /*mi*/, const CMPIContext* context, const CMPIResult* result,
+                                         const CMPIObjectPath* reference, const CMPIInstance* instance,
+                                         const char** properties) {
+    return modifyInstance({loggerNetworkProvider, UNIT, __func__, broker}, context, result, reference, instance,
+                          properties);
 }
 
 CMPIStatus NetworkAdapter_DeleteInstance(CMPIInstanceMI* /*mi*/, const CMPIContext* /*context*/,
@@ -71,10 +73,10 @@ CMPIStatus NetworkAdapter_MethodCleanup(CMPIMethodMI* /*mi*/, const CMPIContext*
     return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
 }
 
-CMPIStatus NetworkAdapter_InvokeMethod(CMPIMethodMI* /*mi*/, const CMPIContext* /*context*/,
-                                       const CMPIResult* /*result*/, const CMPIObjectPath* /*reference*/,
-                                       const char* /*methodName*/, const CMPIArgs* /*in*/, CMPIArgs* /*out*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+CMPIStatus NetworkAdapter_InvokeMethod(CMPIMethodMI* /*mi*/, const CMPIContext* /*context*/, const CMPIResult* result,
+                                       const CMPIObjectPath* reference, const char* methodName, const CMPIArgs* in,
+                                       CMPIArgs* /*out*/) {
+    return invokeMethod({loggerNetworkProvider, UNIT, __func__, broker}, result, reference, methodName, in);
 }
 
 CMPIStatus NetworkAdapter_IndicationCleanup(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,

@@ -1,6 +1,7 @@
 #include "providers/ReadOperations.h"
 
 #include "instrumentation/Utilities.h"
+#include "providers/Texts.h"
 #include "trace/Trace.h"
 
 #include <cstdint>
@@ -27,10 +28,6 @@ void markExit(const ReadFunction& self) {
 
 void logFailure(const ReadFunction& self, const char* text) {
     ProviderLog(self.logger, self.file, self.function).message(LEVEL_FAILURE, text, self.line);
-}
-
-const char* characters(const CMPIString* text, CMPIStatus* status) {
-    return text != nullptr ? CMGetCharsPtr(text, status) : nullptr;
 }
 
 /**

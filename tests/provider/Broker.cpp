@@ -120,7 +120,7 @@ class Collector final : public marlo::broker::ResultSink {
 
     void path(const CMPIObjectPath& path) override { _answer.paths.push_back(marlo::broker::Broker::toModel(path)); }
 
-    void data(const CMPIData&) override {}
+    void data(const CMPIData& data) override { _answer.values.push_back(marlo::broker::Broker::toModel(data)); }
 
     void error(CMPIrc, const std::string&) override {}
 

@@ -103,7 +103,8 @@ struct Answer {
     std::string message;
     std::vector<marlo::Instance> instances;
     std::vector<marlo::ObjectPath> paths;
-    bool done = false; ///< the provider ended its answer with returnDone
+    std::vector<marlo::Value> values; ///< a method's own results
+    bool done = false;                ///< the provider ended its answer with returnDone
 };
 
 /** One broker, whose slots may be made to fail. */

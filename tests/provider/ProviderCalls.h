@@ -1,6 +1,6 @@
 /**
  * @file
- * The read operations of the loaded provider library, called as an object manager calls them.
+ * The operations of the loaded provider library, called as an object manager calls them.
  */
 #pragma once
 
@@ -82,11 +82,41 @@ class ProviderCalls {
         });
     }
 
+    /** Of the configuration class unless the path names another. */
+    Answer modifyInstance(const marlo::ObjectPath& reference, const marlo::Instance& changed,
+                          PropertyList properties = {}) {
+        CMPIInstanceMI* mi = instanceMI(configurationProvider());
+        return call(reference, [&](const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
+            return mi->ft->modifyInstance(mi, context, result, path, adopted(_setup.real.newInstance(changed)),
+                                          properties.get());
+        });
+    }
+
+    Answer invokeMethod(const marlo::ObjectPath& reference, const std::string& method,
+                        const std::vector<marlo::NamedValue>& arguments = {}) {
+        CMPIMethodMI* mi = createMethodMI(broker());
+        return call(reference, [&](const CMPIContext* context, const CMPIResult* result, const CMPIObjectPath* path) {
+            CMPIArgs* out = adopted(_setup.real.newArgs({}));
+            const CMPIStatus status = mi->ft->invokeMethod(mi, context, result, path, method.c_str(),
+                                                           adopted(_setup.real.newArgs(arguments)), out);
+            outArguments = marlo::broker::Broker::toModel(*out);
+            return status;
+        });
+    }
+
+    /** What the last method wrote to its out arguments. */
+    std::vector<marlo::NamedValue> outArguments;
+
     CMPIInstanceMI* instanceMI(const Subject& subject) { return createInstanceMI(subject.unit(), broker()); }
 
   private:
     [[nodiscard]] const CMPIBroker* broker() const {
         return _viaFaulty ? _setup.faulty.handle() : _setup.real.handle();
+    }
+
+    template <typename Handle>
+    Handle* adopted(Handle* handle) {
+        return _viaFaulty ? _setup.faulty.adopt(handle) : handle;
     }
 
     Answer call(const marlo::ObjectPath& reference, const BrokerSetup::Call& function) {

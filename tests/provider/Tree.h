@@ -63,6 +63,23 @@ inline std::vector<std::string> normalised(std::vector<std::string> lines) {
     return lines;
 }
 
+/** What was done to cursors and what was logged, in order: the record without the traces and the buffers. */
+inline std::vector<std::string> flow() {
+    std::vector<std::string> lines = scripted_agent::record();
+    std::erase_if(lines,
+                  [](const std::string& each) { return !each.starts_with("cursor ") && !each.starts_with("log "); });
+    return lines;
+}
+
+/** The recorded lines of a sink, without its name. */
+inline std::vector<std::string> linesOf(const std::string& sink) {
+    std::vector<std::string> lines = scripted_agent::recorded(sink + " ");
+    for (std::string& each : lines) {
+        each.erase(0, sink.size() + 1);
+    }
+    return lines;
+}
+
 /** One line of the log, or of the trace, as the record has it after normalising. */
 inline std::string line(const std::string& sink, int level, const std::string& logger, const std::string& unit,
                         const std::string& function, const std::string& text) {

@@ -214,6 +214,13 @@ CMPIArray* FaultyBroker::adopt(CMPIArray* array) {
     });
 }
 
+CMPIArgs* FaultyBroker::adopt(CMPIArgs* arguments) {
+    return withTable(arguments, &CMPIArgs::ft, [](CMPIArgsFT& table) {
+        PUT(CMPIArgsFT, getArg, "args.");
+        PUT(CMPIArgsFT, getArgCount, "args.");
+    });
+}
+
 CMPIString* FaultyBroker::adopt(CMPIString* string) {
     return withTable(string, &CMPIString::ft, [](CMPIStringFT& table) { PUT(CMPIStringFT, getCharPtr, "string."); });
 }

@@ -26,7 +26,7 @@ enum class Failure {
 
 /**
  * A handle of its own on a broker. Slots are named after the function tables: "newInstance", "enumerateInstances" and
- * so on for the broker's, "instance.setProperty", "objectPath.getKeyCount", "array.setElementAt",
+ * so on for the broker's, "instance.setProperty", "objectPath.getKeyCount", "array.setElementAt", "args.getArg",
  * "string.getCharPtr", "enumeration.getNext", "result.returnInstance" for those of encapsulated objects, which pass
  * through this broker by being created by it or by adopt(). The real slot does the work of every call that does not
  * fail.
@@ -49,6 +49,7 @@ class FaultyBroker {
     CMPIObjectPath* adopt(CMPIObjectPath* path);
     CMPIInstance* adopt(CMPIInstance* instance);
     CMPIArray* adopt(CMPIArray* array);
+    CMPIArgs* adopt(CMPIArgs* arguments);
     CMPIString* adopt(CMPIString* string);
     CMPIEnumeration* adopt(CMPIEnumeration* enumeration);
     const CMPIResult* adopt(const CMPIResult* result);
