@@ -1,12 +1,14 @@
 #include "platform/Objects.h"
 
 #include "agent/config/Configuration.h"
+#include "agent/file/FileCache.h"
 #include "agent/file/TreeFile.h"
 #include "agent/hardware/Hardware.h"
 #include "agent/text/Text.h"
 
 #include <array>
 #include <cerrno>
+#include <mutex>
 #include <system_error>
 
 #include <unistd.h>
@@ -84,17 +86,34 @@ void forEachPort(const Agent::HardwareInventory& inventory, const ObjectSink& si
     }
 }
 
+using Inventory = std::shared_ptr<const Agent::HardwareInventory>;
+
+Inventory parseInventory(const std::string& text, const std::string& path) {
+    return std::make_shared<const Agent::HardwareInventory>(Agent::parseTreeDescription(text, path).hardware);
+}
+
+/** One description serves all requests until it changes; the configuration may name another one meanwhile. */
+Inventory describedInventory(const std::string& path) {
+    static std::mutex mutex;
+    static std::optional<Agent::FileCache<Agent::HardwareInventory>> cache;
+    const std::lock_guard lock(mutex);
+    if (!cache || cache->path() != path) {
+        cache.emplace(path, parseInventory);
+    }
+    return cache->current();
+}
+
 } // namespace
 
 const ObjectClass networkCard{"TAVIS_NetworkCard", forEachCard};
 const ObjectClass networkPort{"TAVIS_NetworkPort", forEachPort};
 
-Agent::HardwareInventory currentInventory() {
+std::shared_ptr<const Agent::HardwareInventory> currentInventory() {
     const auto configuration = Agent::loadConfiguration();
     if (configuration.backEnd == Agent::Configuration::BackEndKind::File) {
-        return Agent::readTreeFile(configuration.treeFile).hardware;
+        return describedInventory(configuration.treeFile);
     }
-    return Agent::Linux::readHardwareInventory();
+    return std::make_shared<const Agent::HardwareInventory>(Agent::Linux::readHardwareInventory());
 }
 
 } // namespace Orv::Platform

@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <functional>
+#include <memory>
 #include <optional>
 #include <string>
 #include <variant>
@@ -50,6 +51,6 @@ extern const ObjectClass networkPort;
  * The hardware of this host, or, when the agent's configuration names a description of a simulated host, what that
  * describes: whoever tries things on a simulated host sees it whole. Throws std::exception with the reason.
  */
-Agent::HardwareInventory currentInventory();
+std::shared_ptr<const Agent::HardwareInventory> currentInventory();
 
 } // namespace Orv::Platform

@@ -121,7 +121,7 @@ CMPIStatus finish(const Request& request, CMPIStatus status) {
 CMPIStatus Request::enumerateNames() const {
     const std::string nameSpace = nameSpaceOf(reference);
     CMPIStatus status{CMPI_RC_OK, nullptr};
-    objects.forEach(currentInventory(), [&](const Object& object) {
+    objects.forEach(*currentInventory(), [&](const Object& object) {
         status = CMReturnObjectPath(result, makePath(*this, nameSpace, object));
         return status.rc == CMPI_RC_OK;
     });
@@ -131,7 +131,7 @@ CMPIStatus Request::enumerateNames() const {
 CMPIStatus Request::enumerate(const char** properties) const {
     const std::string nameSpace = nameSpaceOf(reference);
     CMPIStatus status{CMPI_RC_OK, nullptr};
-    objects.forEach(currentInventory(), [&](const Object& object) {
+    objects.forEach(*currentInventory(), [&](const Object& object) {
         status = CMReturnInstance(result, makeInstance(*this, nameSpace, object, properties));
         return status.rc == CMPI_RC_OK;
     });
@@ -141,7 +141,7 @@ CMPIStatus Request::enumerate(const char** properties) const {
 CMPIStatus Request::get(const char** properties) const {
     const std::string nameSpace = nameSpaceOf(reference);
     CMPIStatus status{CMPI_RC_ERR_NOT_FOUND, nullptr};
-    objects.forEach(currentInventory(), [&](const Object& object) {
+    objects.forEach(*currentInventory(), [&](const Object& object) {
         if (!hasKeys(reference, object)) {
             return true;
         }

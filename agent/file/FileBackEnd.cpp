@@ -1,29 +1,20 @@
 #include "agent/file/FileBackEnd.h"
 
 #include "agent/change/Resolve.h"
-#include "agent/config/TextFile.h"
 #include "agent/file/DescriptionChange.h"
+#include "agent/file/FileCache.h"
 #include "agent/file/TreeFile.h"
 #include "agent/persistence/FileTransaction.h"
 
 #include <algorithm>
-#include <functional>
 #include <map>
 #include <mutex>
 #include <stdexcept>
-#include <utility>
+#include <vector>
 
 namespace Orv::Agent {
 
 namespace {
-
-/** What the last reading gave. */
-struct Reading {
-    std::shared_ptr<const Tree> tree;
-    FileStamp stamp;
-    bool settled = false;
-    std::size_t textHash = 0;
-};
 
 /** An adapter of a tree, and which one of the description's it is. */
 struct AdapterPlace {
@@ -40,20 +31,17 @@ AdapterPlace placeOf(const Tree& tree, const std::string& path) {
 
 class FileBackEnd : public BackEnd {
   public:
-    explicit FileBackEnd(std::string path) : _path(std::move(path)) {}
+    explicit FileBackEnd(const std::string& path) : _path(path), _file(path, parseTree) {}
 
     std::shared_ptr<const Tree> snapshot() override {
         const std::lock_guard lock(_mutex);
-        if (!isCurrent()) {
-            refresh();
-        }
-        return _last.tree;
+        return _file.current();
     }
 
     void setProperty(const std::string& path, NodeLexicon::Properties property, const PropertyValue& value) override {
         const std::lock_guard lock(_mutex);
         const TextFile file = readTextFile(_path);
-        const AdapterPlace adapter = placeOf(*treeOf(file), path);
+        const AdapterPlace adapter = placeOf(*_file.madeOf(file), path);
         if (adapter.node == nullptr) {
             throw ChangeError(path, property, value, "there is no such adapter in " + _path);
         }
@@ -69,27 +57,6 @@ class FileBackEnd : public BackEnd {
     }
 
   private:
-    /** Throws when there is no file. */
-    bool isCurrent() { return stampOf(_path) == _last.stamp && _last.settled && _last.tree != nullptr; }
-
-    void refresh() {
-        TextFile file = readTextFile(_path);
-        const std::size_t hash = std::hash<std::string>()(file.text);
-        const bool same = _last.tree != nullptr && file.stamp == _last.stamp && hash == _last.textHash;
-        std::shared_ptr<const Tree> tree = same ? _last.tree : nullptr;
-        _last = {}; // its memory serves for the next one, if no cursor holds the tree
-        if (tree == nullptr) {
-            tree = parseTree(file.text, _path);
-        }
-        _last = {std::move(tree), file.stamp, file.settled, hash};
-    }
-
-    std::shared_ptr<const Tree> treeOf(const TextFile& file) {
-        const bool isLast = _last.tree != nullptr && file.stamp == _last.stamp &&
-                            std::hash<std::string>()(file.text) == _last.textHash;
-        return isLast ? _last.tree : parseTree(file.text, _path);
-    }
-
     /** Makes the change in the file; does not touch a file that says so already. */
     void write(const std::string& text, const AdapterPlace& adapter, const AdapterSettings& wanted) {
         const std::vector<KeyEdit> edits = keyEdits(adapter.node->properties, wanted);
@@ -115,15 +82,15 @@ class FileBackEnd : public BackEnd {
     }
 
     const std::string _path;
-    std::mutex _mutex;
-    Reading _last;
+    std::mutex _mutex; ///< guards what follows
+    FileCache<Tree> _file;
     std::map<std::string, PendingPair> _pending; ///< by path
 };
 
 } // namespace
 
-std::unique_ptr<BackEnd> makeFileBackEnd(std::string path) {
-    return std::make_unique<FileBackEnd>(std::move(path));
+std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path) {
+    return std::make_unique<FileBackEnd>(path);
 }
 
 } // namespace Orv::Agent

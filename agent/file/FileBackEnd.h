@@ -19,6 +19,6 @@ namespace Orv::Agent {
  * A property is written by the rules of agent/change, into the file, which is replaced whole; comments and all other
  * keys stay.
  */
-std::unique_ptr<BackEnd> makeFileBackEnd(std::string path);
+std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path);
 
 } // namespace Orv::Agent

@@ -6,6 +6,7 @@ namespace Orv::Agent {
 
 Tree::Tree(std::vector<NodePointer> nodes) {
     _nodes.reserve(nodes.size());
+    _byPath.max_load_factor(0.5F);
     _byPath.reserve(nodes.size());
     for (NodePointer& node : nodes) {
         if (!_byPath.emplace(node->path, node).second) {

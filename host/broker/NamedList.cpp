@@ -8,13 +8,6 @@
 
 namespace marlo::broker {
 
-namespace {
-
-/** Holds the properties of an ordinary class without growing again. */
-constexpr CMPICount firstCapacity = 12;
-
-} // namespace
-
 const NamedData* NamedList::find(std::string_view name) const {
     const auto* found =
         std::find_if(begin(), end(), [name](const NamedData& entry) { return equalNames(entry.name->text(), name); });
@@ -27,7 +20,7 @@ void NamedList::set(std::string_view name, const CMPIData& data) {
         return;
     }
     if (_size == _capacity) {
-        grow(_capacity == 0 ? firstCapacity : _capacity * 2);
+        grow(_capacity == 0 ? _firstCapacity : _capacity * 2);
     }
     _entries[_size] = {StringObject::makeRecurring(*_arena, name), data};
     ++_size;

@@ -20,7 +20,12 @@ struct NamedData {
 /** Names are compared without case (DSP0004) and keep the case in which they were first given. */
 class NamedList {
   public:
-    explicit NamedList(Arena& arena) : _arena(&arena) {}
+    /** Holds the properties of an ordinary class without growing again. */
+    static constexpr CMPICount ordinaryCapacity = 12;
+
+    /** `firstCapacity`: the number of entries that there is room for once there are any. */
+    explicit NamedList(Arena& arena, CMPICount firstCapacity = ordinaryCapacity)
+        : _arena(&arena), _firstCapacity(firstCapacity) {}
 
     [[nodiscard]] CMPICount size() const { return _size; }
 
@@ -46,6 +51,7 @@ class NamedList {
     NamedData* _entries = nullptr;
     CMPICount _size = 0;
     CMPICount _capacity = 0;
+    CMPICount _firstCapacity;
 };
 
 } // namespace marlo::broker

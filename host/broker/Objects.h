@@ -169,6 +169,9 @@ class DateTimeObject final : public Object<CMPIDateTime, Kind::dateTime> {
 
 class ObjectPathObject final : public Object<CMPIObjectPath, Kind::objectPath> {
   public:
+    /** Few classes have more keys, and there is a list of them for every path. */
+    static constexpr CMPICount ordinaryKeys = 4;
+
     static ObjectPathObject* make(Arena& arena, const BrokerState& broker, std::string_view nameSpace,
                                   std::string_view className);
 
@@ -184,7 +187,7 @@ class ObjectPathObject final : public Object<CMPIObjectPath, Kind::objectPath> {
     friend class Arena;
 
     ObjectPathObject(Arena& arena, const BrokerState& brokerState)
-        : Object(&arena, objectPathTable), broker(&brokerState), keys(arena) {}
+        : Object(&arena, objectPathTable), broker(&brokerState), keys(arena, ordinaryKeys) {}
 };
 
 class InstanceObject final : public Object<CMPIInstance, Kind::instance> {
