@@ -58,6 +58,9 @@ void readBackEnd(TomlReader& reader, const std::string& path, Configuration& con
         configuration.treeFile = std::filesystem::path(path).parent_path() / *tree;
         configuration.backEnd = Configuration::BackEndKind::File;
     }
+    if (const auto control = reader.text("control")) {
+        configuration.control = std::filesystem::path(path).parent_path() / *control;
+    }
     if (const auto name = reader.text("back_end")) {
         const auto backEnd = backEndOf(*name);
         if (!backEnd) {
@@ -129,6 +132,7 @@ void overrideBackEnd(Configuration& configuration) {
         configuration.treeFile = *tree;
         configuration.backEnd = Configuration::BackEndKind::File;
     }
+    configuration.control = filledVariable("ORV_AGENT_CONTROL").value_or(configuration.control);
     if (configuration.backEnd == Configuration::BackEndKind::File && configuration.treeFile.empty()) {
         refuseVariable("ORV_AGENT_BACKEND", "the file back end needs ORV_AGENT_TREE");
     }

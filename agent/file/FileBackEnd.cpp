@@ -3,6 +3,7 @@
 #include "agent/change/Resolve.h"
 #include "agent/file/DescriptionChange.h"
 #include "agent/file/FileCache.h"
+#include "agent/file/FileWatch.h"
 #include "agent/file/TreeFile.h"
 #include "agent/persistence/FileTransaction.h"
 
@@ -10,6 +11,7 @@
 #include <map>
 #include <mutex>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 namespace Orv::Agent {
@@ -31,7 +33,8 @@ AdapterPlace placeOf(const Tree& tree, const std::string& path) {
 
 class FileBackEnd : public BackEnd {
   public:
-    explicit FileBackEnd(const std::string& path) : _path(path), _file(path, parseTree) {}
+    FileBackEnd(const std::string& path, std::string control)
+        : _path(path), _control(std::move(control)), _file(path, parseTree) {}
 
     std::shared_ptr<const Tree> snapshot() override {
         const std::lock_guard lock(_mutex);
@@ -54,6 +57,10 @@ class FileBackEnd : public BackEnd {
             throw ChangeError(name, property, value, failure.what());
         }
         _pending[path] = resolution.pending;
+    }
+
+    std::unique_ptr<EventWatch> watch(EventSink& sink) override {
+        return makeFileWatch(*this, _path, _control, sink);
     }
 
   private:
@@ -82,6 +89,7 @@ class FileBackEnd : public BackEnd {
     }
 
     const std::string _path;
+    const std::string _control;
     std::mutex _mutex; ///< guards what follows
     FileCache<Tree> _file;
     std::map<std::string, PendingPair> _pending; ///< by path
@@ -89,8 +97,8 @@ class FileBackEnd : public BackEnd {
 
 } // namespace
 
-std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path) {
-    return std::make_unique<FileBackEnd>(path);
+std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path, std::string control) {
+    return std::make_unique<FileBackEnd>(path, std::move(control));
 }
 
 } // namespace Orv::Agent

@@ -17,8 +17,8 @@ namespace Orv::Agent {
  * wrong: an older state of it is never served in its place.
  *
  * A property is written by the rules of agent/change, into the file, which is replaced whole; comments and all other
- * keys stay.
+ * keys stay. `control` is the path of the FIFO that plays events (see FileWatch.h); empty for none.
  */
-std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path);
+std::unique_ptr<BackEnd> makeFileBackEnd(const std::string& path, std::string control = {});
 
 } // namespace Orv::Agent

@@ -14,7 +14,7 @@ namespace {
 
 std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
     if (configuration.backEnd == Configuration::BackEndKind::File) {
-        return makeFileBackEnd(configuration.treeFile);
+        return makeFileBackEnd(configuration.treeFile, configuration.control);
     }
     return Linux::makeLinuxBackEnd();
 }

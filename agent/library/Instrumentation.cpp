@@ -1,8 +1,10 @@
 #include "instrumentation/Instrumentation.h"
 
 #include "agent/library/BackEndHolder.h"
+#include "agent/library/Monitoring.h"
 #include "agent/tree/Cursor.h"
 
+#include <cstdint>
 #include <memory>
 #include <stdexcept>
 #include <utility>
@@ -10,6 +12,15 @@
 namespace Orv {
 
 using Agent::reported;
+
+namespace {
+
+Agent::Monitor::Key keyOf(NodeLexicon::NodeType type, Instrumentation::MonitoringCallback callback,
+                          const void* context) {
+    return {type, reinterpret_cast<std::uintptr_t>(callback), context};
+}
+
+} // namespace
 
 struct Instrumentation::State {
     Agent::Cursor cursor;
@@ -74,14 +85,20 @@ std::string Instrumentation::getPathToParentNode() {
     return _state->cursor.parentPath();
 }
 
-void Instrumentation::startMonitoring(NodeLexicon::NodeType /*type*/, MonitoringCallback /*callback*/,
-                                      const void* /*context*/) {
-    reported("startMonitoring", [] { throw std::runtime_error("this agent does not monitor nodes yet"); });
+void Instrumentation::startMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
+    reported("startMonitoring", [&] {
+        if (callback == nullptr) {
+            throw std::invalid_argument("nothing can be monitored without a callback");
+        }
+        Agent::processMonitor().start(keyOf(type, callback, context), [=](const Agent::Handover::Delivery& delivery) {
+            callback(static_cast<unsigned int>(delivery.code), DateTime(Agent::localTime(delivery.time)),
+                     delivery.path, context);
+        });
+    });
 }
 
-void Instrumentation::stopMonitoring(NodeLexicon::NodeType /*type*/, MonitoringCallback /*callback*/,
-                                     const void* /*context*/) {
-    reported("stopMonitoring", [] { throw std::runtime_error("this agent does not monitor nodes yet"); });
+void Instrumentation::stopMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
+    reported("stopMonitoring", [&] { Agent::processMonitor().stop(keyOf(type, callback, context)); });
 }
 
 } // namespace Orv

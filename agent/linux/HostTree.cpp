@@ -13,6 +13,7 @@ namespace {
 
 constexpr const char* hostPath = "/host";
 constexpr const char* chassisPath = "/host/chassis";
+constexpr const char* chassisDescription = "Chassis";
 constexpr const char* controllerPath = "/host/bmc";
 constexpr const char* controllerDescription = "BMC";
 
@@ -43,6 +44,12 @@ auto ask(const Question& question) -> decltype(question()) {
 
 std::shared_ptr<const Tree> HostTree::update(const KernelState& state, const HostConfiguration& configuration,
                                              const std::set<int>& changed) {
+    rebuild(state, configuration, changed);
+    return assemble(configuration.hostName());
+}
+
+void HostTree::rebuild(const KernelState& state, const HostConfiguration& configuration,
+                       const std::set<int>& changed) {
     for (const int index : changed) {
         const auto link = state.links().find(index);
         if (link == state.links().end() || isLoopback(link->second)) {
@@ -51,7 +58,17 @@ std::shared_ptr<const Tree> HostTree::update(const KernelState& state, const Hos
             updateInterface(link->second, state, configuration);
         }
     }
-    return assemble(configuration.hostName());
+}
+
+Tree::NodePointer HostTree::adapter(int index) const {
+    const auto found = _interfaces.find(index);
+    return found == _interfaces.end() ? nullptr : found->second.adapter;
+}
+
+std::vector<Tree::NodePointer> HostTree::ancestors(int index, const HostConfiguration& configuration) const {
+    const auto found = _interfaces.find(index);
+    return found == _interfaces.end() ? std::vector<NodePointer>()
+                                      : above(found->second.device, configuration.hostName());
 }
 
 void HostTree::updateInterface(const Link& link, const KernelState& state, const HostConfiguration& configuration) {
@@ -117,6 +134,22 @@ HostTree::Device HostTree::deviceOf(const Link& link) const {
     return {std::string(chassisPath) + "/virtual/" + kind, kind, false, false};
 }
 
+/** A host, chassis or device node: that of the last tree where it is the same. */
+Tree::NodePointer HostTree::structureNode(const std::string& path, const std::string& parent,
+                                          const std::string& description) const {
+    const auto known = _structure.find(path);
+    return keep(known == _structure.end() ? nullptr : known->second, {path, parent, std::nullopt, description, {}});
+}
+
+/** The device, what it is in, and the host. */
+std::vector<Tree::NodePointer> HostTree::above(const Device& device, const std::string& hostName) const {
+    const bool controller = device.managementController;
+    const char* path = controller ? controllerPath : chassisPath;
+    return {structureNode(device.path, path, device.description),
+            structureNode(path, hostPath, controller ? controllerDescription : chassisDescription),
+            structureNode(hostPath, "", hostName)};
+}
+
 /** Host, chassis and the devices that carry something; those of the last tree are shared or forgotten. */
 std::vector<Tree::NodePointer> HostTree::structure(const std::string& hostName) {
     std::map<std::string, NodePointer> fresh;
@@ -124,14 +157,12 @@ std::vector<Tree::NodePointer> HostTree::structure(const std::string& hostName) 
     const auto add = [&](const std::string& path, const std::string& parent, const std::string& description) {
         const auto [place, isNew] = fresh.try_emplace(path);
         if (isNew) {
-            const auto known = _structure.find(path);
-            place->second = keep(known == _structure.end() ? nullptr : known->second,
-                                 {path, parent, std::nullopt, description, {}});
+            place->second = structureNode(path, parent, description);
             nodes.push_back(place->second);
         }
     };
     add(hostPath, "", hostName);
-    add(chassisPath, hostPath, "Chassis");
+    add(chassisPath, hostPath, chassisDescription);
     for (const auto& [index, interface] : _interfaces) {
         const Device& device = interface.device;
         if (device.managementController) {

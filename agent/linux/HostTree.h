@@ -36,13 +36,22 @@ class HostTree {
   public:
     explicit HostTree(HardwareSource hardware) : _hardware(std::move(hardware)) {}
 
+    using NodePointer = Tree::NodePointer;
+
     /** Builds anew the nodes of the interfaces in `changed`, takes the others over, and puts the tree together. */
     std::shared_ptr<const Tree> update(const KernelState& state, const HostConfiguration& configuration,
                                        const std::set<int>& changed);
 
-  private:
-    using NodePointer = Tree::NodePointer;
+    /** The first of these alone: what it costs does not depend on how many other interfaces there are. */
+    void rebuild(const KernelState& state, const HostConfiguration& configuration, const std::set<int>& changed);
 
+    /** The adapter node of an interface as it was last built; null when there is none. */
+    [[nodiscard]] NodePointer adapter(int index) const;
+
+    /** What is above that node, from its device up; empty when there is no such node. */
+    [[nodiscard]] std::vector<NodePointer> ancestors(int index, const HostConfiguration& configuration) const;
+
+  private:
     /** The device node above an interface. */
     struct Device {
         std::string path;
@@ -63,6 +72,9 @@ class HostTree {
     void identify(const Link& link, Interface& interface);
     Device deviceOf(const Link& link) const;
     std::optional<ParentDevice> parentOf(const Link& link) const;
+    [[nodiscard]] NodePointer structureNode(const std::string& path, const std::string& parent,
+                                            const std::string& description) const;
+    [[nodiscard]] std::vector<NodePointer> above(const Device& device, const std::string& hostName) const;
     std::shared_ptr<const Tree> assemble(const std::string& hostName);
     std::vector<NodePointer> structure(const std::string& hostName);
 

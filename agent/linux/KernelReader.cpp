@@ -76,10 +76,15 @@ KernelReader::KernelReader(int receiveBytes) : _notifications(receiveBytes) {
     update();
 }
 
-const KernelState& KernelReader::update() {
+const KernelState& KernelReader::follow() {
     if (!drain()) {
         readAll();
     }
+    return _state;
+}
+
+const KernelState& KernelReader::update() {
+    follow();
     for (const std::uint8_t family : addressFamilies) {
         if (_state.routesStale(family)) {
             readRoutes(family);
@@ -89,10 +94,23 @@ const KernelState& KernelReader::update() {
     return _state;
 }
 
+void KernelReader::step() {
+    if (_step && _state.hasChanges()) {
+        _step(_state);
+    }
+}
+
 /** Applies what waits. False when the tables are not to be relied on. */
-bool KernelReader::drain() {
+bool KernelReader::drain(const std::function<void(const Message&)>& alsoTo) {
     const bool complete = std::exchange(_complete, false);
-    const auto apply = [this](const nlmsghdr& message) { _state.apply(parseMessage(message)); };
+    const auto apply = [&](const nlmsghdr& message) {
+        const Message parsed = parseMessage(message);
+        if (alsoTo) {
+            alsoTo(parsed);
+        }
+        _state.apply(parsed);
+        step();
+    };
     _complete = _notifications.drain(apply) == NotificationSocket::Drain::complete && complete;
     return _complete;
 }
@@ -102,16 +120,19 @@ void KernelReader::readAll() {
     for (int attempt = 0; attempt < dumpAttempts && !undisturbed; ++attempt) {
         KernelState fresh;
         undisturbed = readTables(fresh);
+        // What was announced while the dumps ran may be newer or older than what they show; applied in order, the
+        // announcements lead to the present either way. Applied to the old tables as well, they make the steps that
+        // they are, and not those from a present back into a past; the old tables then lack nothing but what was
+        // lost, which the exchange of the two brings in one step.
+        _complete = true;
+        undisturbed = drain([&](const Message& message) { fresh.apply(message); }) && undisturbed;
         fresh.markChanged(_state.takeChanges());
         for (const auto& known : _state.links()) {
             fresh.markChanged({known.first});
         }
         _state = std::move(fresh);
         _knownGateways.clear();
-        // What was announced while the dumps ran may be newer or older than what they show; applied in order, the
-        // announcements lead to the present either way.
-        _complete = true;
-        undisturbed = drain() && undisturbed;
+        step();
     }
     _complete = undisturbed;
     ++_fullReads;

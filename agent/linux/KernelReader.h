@@ -7,6 +7,7 @@
 #include "agent/linux/KernelState.h"
 #include "agent/linux/NetlinkSocket.h"
 
+#include <functional>
 #include <set>
 
 namespace Orv::Agent::Linux {
@@ -29,6 +30,24 @@ class KernelReader {
      */
     const KernelState& update();
 
+    /** As update(), but for the routes and gateways, which stay as they were. */
+    const KernelState& follow();
+
+    /**
+     * Called by update() and follow() after each message that changed something, with the tables as the message left
+     * them, and once after a full read. takeChanges() may be called from within, and nothing else here.
+     */
+    using Step = std::function<void(const KernelState&)>;
+
+    /** Sets who is called; an empty function: nobody. */
+    void onStep(Step step) { _step = std::move(step); }
+
+    /** As update() or follow() left it. */
+    [[nodiscard]] const KernelState& state() const { return _state; }
+
+    /** Becomes readable when the kernel has something to tell. */
+    [[nodiscard]] int descriptor() const { return _notifications.descriptor(); }
+
     /** The interfaces that changed since the last call, also those that are gone. */
     std::set<int> takeChanges() { return _state.takeChanges(); }
 
@@ -41,11 +60,13 @@ class KernelReader {
     void readRoutes(std::uint8_t family);
     void watchNeighbours();
     void readNeighbour(const GatewayKey& gateway);
-    bool drain();
+    bool drain(const std::function<void(const Message&)>& alsoTo = {});
+    void step();
 
     NotificationSocket _notifications;
     RequestSocket _requests;
     KernelState _state;
+    Step _step;
     std::set<GatewayKey> _knownGateways; ///< the contested ones whose neighbour entry has been read
     bool _neighboursSubscribed = false;
     bool _complete = false; ///< everything was read and no notification lost since

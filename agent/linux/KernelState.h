@@ -72,6 +72,8 @@ class KernelState {
     /** Has these count as changed, too. */
     void markChanged(const std::set<int>& indexes) { _changed.insert(indexes.begin(), indexes.end()); }
 
+    [[nodiscard]] bool hasChanges() const { return !_changed.empty(); }
+
     /** The interfaces of which anything here has changed since the last call, also those that are gone. */
     std::set<int> takeChanges() { return std::exchange(_changed, {}); }
 

@@ -73,6 +73,32 @@ const Header* headerOf(const nlmsghdr& message, Bytes& attributes) {
     return reinterpret_cast<const Header*>(payload.data());
 }
 
+void readBond(const nlattr& attribute, Link& link) {
+    forEachAttribute(bytesOf(attribute), [&](const nlattr& inner) {
+        if (mnl_attr_get_type(&inner) == IFLA_BOND_ACTIVE_SLAVE) {
+            link.activeMember = numberOf<int>(inner).value_or(0);
+        } else if (mnl_attr_get_type(&inner) == IFLA_BOND_PRIMARY) {
+            link.primaryMember = numberOf<int>(inner).value_or(0);
+        }
+    });
+}
+
+/** IFLA_LINKINFO: the kind, and what is particular to it. */
+void readLinkInfo(const nlattr& attribute, Link& link) {
+    const nlattr* data = nullptr;
+    forEachAttribute(bytesOf(attribute), [&](const nlattr& inner) {
+        if (mnl_attr_get_type(&inner) == IFLA_INFO_KIND) {
+            link.kind = textOf(inner);
+        } else if (mnl_attr_get_type(&inner) == IFLA_INFO_DATA) {
+            data = &inner;
+        }
+    });
+    // The numbers of the attributes in it mean something else for every kind.
+    if (data != nullptr && link.kind == "bond") {
+        readBond(*data, link);
+    }
+}
+
 void readLinkAttribute(const nlattr& attribute, Link& link) {
     switch (mnl_attr_get_type(&attribute)) {
     case IFLA_IFNAME:
@@ -94,11 +120,7 @@ void readLinkAttribute(const nlattr& attribute, Link& link) {
         link.parentBus = textOf(attribute);
         break;
     case IFLA_LINKINFO:
-        forEachAttribute(bytesOf(attribute), [&](const nlattr& inner) {
-            if (mnl_attr_get_type(&inner) == IFLA_INFO_KIND) {
-                link.kind = textOf(inner);
-            }
-        });
+        readLinkInfo(attribute, link);
         break;
     default:
         break;

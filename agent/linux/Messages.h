@@ -28,6 +28,8 @@ struct Link {
     std::string kind;                           ///< "veth", "bridge", ...; empty for hardware
     std::string parentName;                     ///< the device that carries it, by its name on its bus
     std::string parentBus;                      ///< "pci", "virtio", ...
+    int activeMember = 0;  ///< of a bond: the member that carries it; 0 when none does, or all do
+    int primaryMember = 0; ///< of a bond: the member that is to carry it where it can; 0 when none is named
 
     bool operator==(const Link&) const = default;
 };

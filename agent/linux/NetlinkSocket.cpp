@@ -273,27 +273,20 @@ void NotificationSocket::ignoreOtherRoutes() {
 }
 
 NotificationSocket::Drain NotificationSocket::drain(const MessageHandler& handler) {
+    Drain result = Drain::complete;
     for (unsigned datagram = 0; datagram < longestDrain; ++datagram) {
         switch (_socket.receive(false, handler)) {
         case NetlinkSocket::Received::messages:
             break;
         case NetlinkSocket::Received::nothing:
-            return Drain::complete;
+            return result;
         case NetlinkSocket::Received::overrun:
-            discard();
-            return Drain::overrun;
+            // Only an empty queue takes new messages again, and what it still holds came before the loss.
+            result = Drain::overrun;
+            break;
         }
     }
-    return Drain::complete;
-}
-
-void NotificationSocket::discard() {
-    // Only an empty queue takes new messages again after an overrun.
-    for (unsigned datagram = 0; datagram < longestDrain; ++datagram) {
-        if (_socket.receive(false, [](const nlmsghdr&) {}) == NetlinkSocket::Received::nothing) {
-            return;
-        }
-    }
+    return result;
 }
 
 } // namespace Orv::Agent::Linux

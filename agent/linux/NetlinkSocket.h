@@ -105,16 +105,14 @@ class NotificationSocket {
     enum class Drain { complete, overrun };
 
     /**
-     * Hands over everything that waits, without blocking. After `overrun` some messages are lost and the rest, which
-     * may contradict what is read from now on, is discarded: read everything anew.
+     * Hands over everything that waits, without blocking. After `overrun` some messages are lost: each of those that
+     * were handed over is true of its moment, but the present must be read anew.
      */
     Drain drain(const MessageHandler& handler);
 
     [[nodiscard]] int descriptor() const { return _socket.descriptor(); }
 
   private:
-    void discard();
-
     NetlinkSocket _socket;
 };
 

@@ -4,9 +4,11 @@
  */
 #pragma once
 
+#include "agent/events/EventRecords.h"
 #include "agent/tree/Tree.h"
 
 #include <memory>
+#include <stdexcept>
 #include <string>
 
 namespace Orv::Agent {
@@ -28,6 +30,20 @@ class BackEnd {
     /** Writes one property of the node at `path`, live and persistent, or throws and leaves everything as it was. */
     virtual void setProperty(const std::string& path, NodeLexicon::Properties property,
                              const PropertyValue& value) = 0;
+
+    /**
+     * Has the differences between consecutive states of the tree posted to `sink`, from the present state on, until
+     * the watch is destroyed. One watch at a time; neither it nor the sink may outlive the back end.
+     */
+    virtual std::unique_ptr<EventWatch> watch(EventSink& /*sink*/) {
+        throw std::runtime_error("this back end does not report events");
+    }
+
+    /** The events that were handed out as paths. */
+    EventRecords& events() { return _events; }
+
+  private:
+    EventRecords _events;
 };
 
 } // namespace Orv::Agent

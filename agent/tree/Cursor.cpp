@@ -46,8 +46,13 @@ bool Cursor::selectIn(std::shared_ptr<const View> view, const std::string& path)
 
 void Cursor::select(const std::string& path) {
     clear();
-    if (!path.empty() && !selectIn(viewOfLastPath().lock(), path)) {
-        selectIn(takeView(), path);
+    if (const auto moment = _backEnd.events().pickUp(path)) {
+        selectIn(std::make_shared<const View>(View{moment->tree, &_backEnd}), moment->path);
+        return;
+    }
+    const std::string live(EventRecords::livePath(path));
+    if (!live.empty() && !selectIn(viewOfLastPath().lock(), live)) {
+        selectIn(takeView(), live);
     }
 }
 

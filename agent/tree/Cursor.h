@@ -17,7 +17,8 @@ namespace Orv::Agent {
  *
  * A selection by type takes a new snapshot. A selection by path is a look-up in the snapshot that the path came from
  * as long as a cursor of this thread holds it: a climb costs no snapshot of its own, and finds the parents of a node
- * that has vanished from the host meanwhile. Any other path is looked up in a new snapshot.
+ * that has vanished from the host meanwhile. The path of an event selects the node as it was at the event, and picks
+ * the event up (see EventRecords). Any other path is looked up in a new snapshot.
  */
 class Cursor {
   public:

@@ -16,9 +16,9 @@ using Orv::Test::TemporaryFile;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-constexpr const char* variables[] = {"ORV_AGENT_CONFIG",     "ORV_AGENT_BACKEND",   "ORV_AGENT_TREE",
-                                     "ORV_AGENT_LOG_LEVEL",  "ORV_AGENT_LOG_SINKS", "ORV_AGENT_TRACE_LEVEL",
-                                     "ORV_AGENT_TRACE_SINKS"};
+constexpr const char* variables[] = {"ORV_AGENT_CONFIG",      "ORV_AGENT_BACKEND",   "ORV_AGENT_TREE",
+                                     "ORV_AGENT_LOG_LEVEL",   "ORV_AGENT_LOG_SINKS", "ORV_AGENT_TRACE_LEVEL",
+                                     "ORV_AGENT_TRACE_SINKS", "ORV_AGENT_CONTROL"};
 
 void clearVariables() {
     for (const char* name : variables) {
@@ -58,6 +58,7 @@ TEST_F(ConfigurationTest, ReadsEveryKey) {
     file.write(R"(
 back_end = "file"
 tree_file = "/srv/lab.toml"
+control = "lab.control"
 [log]
 level = 4000
 sinks = ["syslog", "file:/var/log/marlo.log"]
@@ -68,7 +69,8 @@ sinks = ["stderr"]
     const Configuration expected{Configuration::BackEndKind::File,
                                  "/srv/lab.toml",
                                  {4000, {"syslog", "file:/var/log/marlo.log"}},
-                                 {3000, {"stderr"}}};
+                                 {3000, {"stderr"}},
+                                 (file.directory() / "lab.control").string()};
     EXPECT_EQ(readConfigurationFile(file.path()), expected);
 }
 
@@ -144,8 +146,12 @@ TEST_F(ConfigurationTest, IsOverriddenByTheEnvironment) {
     ::setenv("ORV_AGENT_LOG_SINKS", "stderr,file:/tmp/a b", 1);
     ::setenv("ORV_AGENT_TRACE_LEVEL", "3000", 1);
     ::setenv("ORV_AGENT_TRACE_SINKS", "syslog", 1);
-    const Configuration expected{
-        Configuration::BackEndKind::File, "lab.toml", {4000, {"stderr", "file:/tmp/a b"}}, {3000, {"syslog"}}};
+    ::setenv("ORV_AGENT_CONTROL", "lab.control", 1);
+    const Configuration expected{Configuration::BackEndKind::File,
+                                 "lab.toml",
+                                 {4000, {"stderr", "file:/tmp/a b"}},
+                                 {3000, {"syslog"}},
+                                 "lab.control"};
     EXPECT_EQ(loadConfiguration(), expected);
 }
 
