@@ -70,7 +70,11 @@ void NetlinkSocket::tryOption(int level, int option, int value) {
 }
 
 void NetlinkSocket::send(const nlmsghdr& message) {
-    if (mnl_socket_sendto(_socket.get(), &message, message.nlmsg_len) < 0) {
+    send(std::span(reinterpret_cast<const std::uint8_t*>(&message), message.nlmsg_len));
+}
+
+void NetlinkSocket::send(std::span<const std::uint8_t> messages) {
+    if (mnl_socket_sendto(_socket.get(), messages.data(), messages.size()) < 0) {
         fail(errno, "sending a netlink request");
     }
 }
@@ -179,17 +183,20 @@ std::size_t explanationOffset(const nlmsghdr& message) {
 
 } // namespace
 
-void RequestSocket::Answer::takeEnd(const nlmsghdr& message) {
-    finished = true;
+Verdict verdictOf(const nlmsghdr& message) {
     const std::size_t least = message.nlmsg_type == NLMSG_ERROR ? sizeof(nlmsgerr) : sizeof(int);
     if (mnl_nlmsg_get_payload_len(&message) < least) {
-        return;
+        return {};
     }
     int error = 0;
     std::memcpy(&error, mnl_nlmsg_get_payload(&message), sizeof error);
-    if (error < 0) {
-        const std::string explanation = explanationOf(message, explanationOffset(message));
-        fail(-error, explanation.empty() ? what : std::string(what) + ": " + explanation);
+    return error < 0 ? Verdict{-error, explanationOf(message, explanationOffset(message))} : Verdict{};
+}
+
+void RequestSocket::Answer::takeEnd(const nlmsghdr& message) {
+    finished = true;
+    if (const Verdict verdict = verdictOf(message); verdict.error != 0) {
+        fail(verdict.error, verdict.explanation.empty() ? what : std::string(what) + ": " + verdict.explanation);
     }
 }
 

@@ -11,6 +11,8 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <span>
+#include <string>
 #include <vector>
 
 struct mnl_socket;
@@ -20,6 +22,15 @@ namespace Orv::Agent::Linux {
 
 /** Takes one message; it is valid during the call only. */
 using MessageHandler = std::function<void(const nlmsghdr&)>;
+
+/** How the kernel answered a request. */
+struct Verdict {
+    int error = 0;           ///< errno; 0: done
+    std::string explanation; ///< the kernel's own words, where it has some
+};
+
+/** The verdict in a message of type NLMSG_ERROR or NLMSG_DONE. */
+Verdict verdictOf(const nlmsghdr& message);
 
 /**
  * A bound rtnetlink socket in the network namespace of the thread that made it, for good, whichever thread uses it
@@ -43,6 +54,10 @@ class NetlinkSocket {
     Received receive(bool wait, const MessageHandler& handler);
 
     void send(const nlmsghdr& message);
+
+    /** Sends messages one behind the other, each padded to four bytes, which the kernel works off in one go. */
+    void send(std::span<const std::uint8_t> messages);
+
     void setOption(int level, int option, int value, const char* what);
 
     /** As setOption, for options that older kernels lack and that can be done without. */
