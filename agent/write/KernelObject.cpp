@@ -134,6 +134,14 @@ void KernelObject::remove(std::uint16_t type) {
     _bytes.erase(begin, begin + length);
 }
 
+AddressObject::AddressObject(const nlmsghdr& message) : KernelObject(message, sizeof(ifaddrmsg)) {
+    if (const Bytes times = attribute(IFA_CACHEINFO); times.size() == sizeof(ifa_cacheinfo)) {
+        auto* lifetimes = reinterpret_cast<ifa_cacheinfo*>(times.data());
+        lifetimes->cstamp = 0;
+        lifetimes->tstamp = 0;
+    }
+}
+
 AddressObject::AddressObject(int index, std::uint32_t local, std::uint8_t prefixLength, std::uint32_t broadcast)
     : KernelObject(
           ifaddrmsg{AF_INET, prefixLength, IFA_F_PERMANENT, RT_SCOPE_UNIVERSE, static_cast<std::uint32_t>(index)}) {
@@ -254,10 +262,12 @@ bool RouteObject::setGateway(int index, std::uint32_t gateway) {
     return done;
 }
 
-void RouteObject::replaceSource(std::uint32_t old, std::uint32_t fresh) {
-    if (has(RTA_PREFSRC) && addressIn(attribute(RTA_PREFSRC)) == old) {
-        set(RTA_PREFSRC, addressOctets(fresh));
-    }
+std::optional<std::uint32_t> RouteObject::source() const {
+    return has(RTA_PREFSRC) ? std::optional(addressIn(attribute(RTA_PREFSRC))) : std::nullopt;
+}
+
+void RouteObject::setSource(std::uint32_t address) {
+    set(RTA_PREFSRC, addressOctets(address));
 }
 
 } // namespace Orv::Agent::Linux

@@ -71,7 +71,8 @@ class KernelObject {
 /** An IPv4 address of an interface. */
 class AddressObject : public KernelObject {
   public:
-    explicit AddressObject(const nlmsghdr& message) : KernelObject(message, sizeof(ifaddrmsg)) {}
+    /** Takes a message of the kernel's, without the times at which it was made and changed. */
+    explicit AddressObject(const nlmsghdr& message);
 
     /** A new one of global scope that stays for good; `local` and `broadcast` in host order, 0: no broadcast. */
     AddressObject(int index, std::uint32_t local, std::uint8_t prefixLength, std::uint32_t broadcast);
@@ -133,8 +134,9 @@ class RouteObject : public KernelObject {
     /** Exchanges the gateway on the interface and keeps the rest. False when it has none to exchange. */
     bool setGateway(int index, std::uint32_t gateway);
 
-    /** Exchanges the source address that the route prefers, when it is the old one. */
-    void replaceSource(std::uint32_t old, std::uint32_t fresh);
+    /** The source address that the route prefers, in host order; none when it has none. */
+    [[nodiscard]] std::optional<std::uint32_t> source() const;
+    void setSource(std::uint32_t address);
 
     /** Has the kernel take the gateway to be on the link, whatever the addresses say. */
     void assumeOnLink() { header<rtmsg>().rtm_flags |= RTNH_F_ONLINK; }

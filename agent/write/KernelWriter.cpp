@@ -148,6 +148,16 @@ RouteObject defaultBy(Ipv4Address gateway, const RouteObject* present, int index
     return {index, gateway.number, present != nullptr ? present->metric() : 0};
 }
 
+/** The address that routes no longer may have as their source, when there is one to take its place. */
+std::optional<std::uint32_t> formerSource(const InterfaceTables& before, const Ipv4Settings& wanted) {
+    const auto place = reportedAddress(before);
+    if (!place || !wanted.address) {
+        return std::nullopt;
+    }
+    const std::uint32_t old = before.addresses[*place].local();
+    return old == wanted.address->address.number ? std::nullopt : std::optional(old);
+}
+
 } // namespace
 
 std::optional<std::size_t> reportedAddress(const InterfaceTables& tables) {
@@ -199,10 +209,10 @@ bool KernelWriter::sharesDefault(const RouteObject& route, int index) {
 void KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& wanted) {
     AddressPlan plan = planAddress(before, wanted.address);
     InterfaceTables expected{before.index, plan.result, before.routes};
-    const auto oldAddress = reportedAddress(before);
+    const auto old = formerSource(before, wanted);
     for (RouteObject& route : expected.routes) {
-        if (oldAddress && wanted.address) {
-            route.replaceSource(before.addresses[*oldAddress].local(), wanted.address->address.number);
+        if (old && route.source() == old) {
+            route.setSource(wanted.address->address.number);
         }
     }
     const auto place = reportedDefault(expected);
@@ -226,11 +236,20 @@ void KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& want
     // Whatever is to be removed may be gone by itself, as a default route with the old address.
     apply(std::move(plan.steps), {ESRCH, EADDRNOTAVAIL});
     if (!expected.addresses.empty() && !expected.routes.empty()) {
-        putBackRoutes(expected, read(before.index));
+        putBackRoutes(expected, read(before.index), old);
     }
 }
 
-void KernelWriter::putBackRoutes(const InterfaceTables& wanted, const InterfaceTables& present) {
+/** With `formerSource`, routes from that address go: in tables other than the main one the kernel leaves them. */
+void KernelWriter::putBackRoutes(const InterfaceTables& wanted, const InterfaceTables& present,
+                                 std::optional<std::uint32_t> formerSource) {
+    ChangeBatch stale;
+    for (const RouteObject& route : present.routes) {
+        if (formerSource && route.source() == formerSource) {
+            stale.add(RTM_DELROUTE, 0, route, "removing a route from the former address");
+        }
+    }
+    apply(std::move(stale), {ESRCH});
     ChangeBatch missing;
     std::vector<RouteObject> routes;
     for (const RouteObject& route : wanted.routes) {
@@ -238,9 +257,6 @@ void KernelWriter::putBackRoutes(const InterfaceTables& wanted, const InterfaceT
             routes.push_back(route);
             add(missing, NLM_F_APPEND, route, wanted.index);
         }
-    }
-    if (missing.empty()) {
-        return;
     }
     const std::lock_guard lock(_mutex);
     ChangeBatch onLink;
@@ -270,7 +286,7 @@ void KernelWriter::putBack(const InterfaceTables& before) {
         }
     }
     apply(std::move(missing), {EEXIST});
-    putBackRoutes(before, present);
+    putBackRoutes(before, present, std::nullopt);
 }
 
 void KernelWriter::restore(const InterfaceTables& before) {
@@ -290,7 +306,7 @@ void KernelWriter::restore(const InterfaceTables& before) {
         }
     }
     apply(std::move(steps), {ESRCH, EADDRNOTAVAIL});
-    putBackRoutes(before, read(before.index));
+    putBackRoutes(before, read(before.index), std::nullopt);
 }
 
 } // namespace Orv::Agent::Linux

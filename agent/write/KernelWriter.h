@@ -49,7 +49,8 @@ class KernelWriter {
 
   private:
     void apply(ChangeBatch batch, std::initializer_list<int> tolerated);
-    void putBackRoutes(const InterfaceTables& wanted, const InterfaceTables& present);
+    void putBackRoutes(const InterfaceTables& wanted, const InterfaceTables& present,
+                       std::optional<std::uint32_t> formerSource);
     [[nodiscard]] bool sharesDefault(const RouteObject& route, int index);
 
     std::mutex _mutex; ///< guards the sockets, and is held for one exchange only
