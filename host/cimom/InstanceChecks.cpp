@@ -1,6 +1,6 @@
 #include "host/cimom/InstanceChecks.h"
 
-#include "host/cimom/ClassChecks.h"
+#include "host/cimom/ChangeChecks.h"
 
 #include <algorithm>
 
@@ -18,11 +18,6 @@ bool isOfType(const Value& value, CMPIType type) {
     return value.type == type ||
            ((type & ~CMPI_ARRAY) == CMPI_string && (value.type & ~CMPI_ARRAY) == CMPI_instance &&
             (type & CMPI_ARRAY) == (value.type & CMPI_ARRAY));
-}
-
-std::string fullTypeName(CMPIType type) {
-    const std::string name = type == CMPI_null ? "none" : typeName(type);
-    return (type & CMPI_ARRAY) != 0 ? name + "[]" : name;
 }
 
 } // namespace

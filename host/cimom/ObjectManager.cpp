@@ -2,12 +2,14 @@
 
 #include "host/broker/Broker.h"
 #include "host/cimom/AgentLog.h"
+#include "host/cimom/ChangeChecks.h"
 #include "host/cimom/ClassChecks.h"
 #include "host/cimom/InstanceChecks.h"
 #include "host/cimom/Provider.h"
 #include "host/cimom/ProviderCall.h"
 #include "host/cimom/SchemaKnowledge.h"
 
+#include <algorithm>
 #include <iostream>
 #include <utility>
 
@@ -56,6 +58,15 @@ void writeToStandardError(const std::string& line) {
     std::cerr << line + '\n'; // one write per line: threads log concurrently
 }
 
+/** Why an operation failed whose provider did not say it: what was logged meanwhile. */
+std::string reasonOf(const std::vector<std::string>& reported) {
+    std::string reason;
+    for (const std::string& line : reported) {
+        reason += (reason.empty() ? "" : "; ") + line;
+    }
+    return reason.empty() ? "the provider ended without an answer, and nothing was logged" : reason;
+}
+
 broker::LogSink brokerLog(std::function<void(const std::string&)> log, bool trace) {
     return [log = std::move(log), trace](const broker::LogLine& line) {
         if (trace || !line.trace) {
@@ -90,6 +101,10 @@ struct ObjectManager::State final : broker::UpCalls {
 
     std::vector<Service> servicesOf(const std::string& nameSpace, const Class& definition) const;
 
+    /** The provider that serves a class itself; throws RequestError with `code` and `what` when none does. */
+    Provider& providerOf(ProviderKind kind, const std::string& nameSpace, const Class& definition, CMPIrc code,
+                         const std::string& what) const;
+
     /** Runs an operation: what is refused and what the agent logs goes into its status. */
     template <typename Operation>
     static Status run(const Operation& operation);
@@ -98,6 +113,10 @@ struct ObjectManager::State final : broker::UpCalls {
                      const InstanceSink& sink);
     Status enumerateNames(const std::string& nameSpace, const std::string& className, const PathSink& sink);
     Status get(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+    Status modify(const Instance& modified, const PropertyList& properties);
+    Status invoke(const ObjectPath& path, const std::string& name, const std::vector<NamedValue>& arguments,
+                  MethodAnswer& answer);
+    void checkOut(const Method& method, const std::string& provider, std::vector<NamedValue>& out);
 
     broker::Outcome enumerateInstances(const ObjectPath& classPath, const PropertyNames& properties,
                                        const UpCalls::InstanceSink& sink) override;
@@ -140,6 +159,17 @@ std::vector<ObjectManager::State::Service> ObjectManager::State::servicesOf(cons
     return services;
 }
 
+Provider& ObjectManager::State::providerOf(ProviderKind kind, const std::string& nameSpace, const Class& definition,
+                                           CMPIrc code, const std::string& what) const {
+    const auto found = std::find_if(providers.begin(), providers.end(), [&](const auto& provider) {
+        return provider->serves(kind, nameSpace, definition.name);
+    });
+    if (found == providers.end()) {
+        throw RequestError(code, "no provider serves the " + what + " of " + definition.name + " in " + nameSpace);
+    }
+    return **found;
+}
+
 template <typename Operation>
 Status ObjectManager::State::run(const Operation& operation) {
     AgentLogCollector collector;
@@ -151,6 +181,9 @@ Status ObjectManager::State::run(const Operation& operation) {
         status = {error.code(), error.what(), {}};
     }
     status.reported = collector.take();
+    if (!status.ok() && status.message.empty()) {
+        status.message = reasonOf(status.reported);
+    }
     return status;
 }
 
@@ -196,13 +229,10 @@ Status ObjectManager::State::get(const ObjectPath& path, const PropertyList& pro
     const Class& definition = requireClass(schema, path.nameSpace, path.className);
     requireProperties(schema, path.nameSpace, definition, properties);
     const ObjectPath checkedPath = requireKeys(definition, path.nameSpace, path);
-    const Service service = servicesOf(path.nameSpace, definition).front();
-    if (service.definition != &definition) {
-        throw RequestError(CMPI_RC_ERR_NOT_SUPPORTED,
-                           "no provider serves the instances of " + definition.name + " itself in " + path.nameSpace);
-    }
-    InstanceChecks checks(schema, path.nameSpace, definition, service.provider->registration().name, onceLog);
-    ProviderCall call(broker, *service.provider, principal);
+    Provider& provider =
+        providerOf(ProviderKind::instance, path.nameSpace, definition, CMPI_RC_ERR_NOT_SUPPORTED, "instances");
+    InstanceChecks checks(schema, path.nameSpace, definition, provider.registration().name, onceLog);
+    ProviderCall call(broker, provider, principal);
     bool found = false;
     Status status = call.getInstance(checkedPath, namesToAsk(definition, properties), [&](Instance&& instance) {
         auto checked = found ? std::nullopt : checks.checkInstance(std::move(instance), properties);
@@ -214,6 +244,62 @@ Status ObjectManager::State::get(const ObjectPath& path, const PropertyList& pro
     if (status.ok() && !found) {
         status = {CMPI_RC_ERR_NOT_FOUND, "there is no instance " + checkedPath.toString(), {}};
     }
+    return status;
+}
+
+Status ObjectManager::State::modify(const Instance& modified, const PropertyList& properties) {
+    const std::string& nameSpace = modified.path.nameSpace;
+    const Class& definition = requireClass(schema, nameSpace, modified.path.className);
+    const ObjectPath path = requireKeys(definition, nameSpace, modified.path);
+    const Modification modification = requireModification(definition, {path, modified.properties}, properties);
+    Provider& provider =
+        providerOf(ProviderKind::instance, nameSpace, definition, CMPI_RC_ERR_NOT_SUPPORTED, "instances");
+    return ProviderCall(broker, provider, principal).modifyInstance(modification.instance, modification.names);
+}
+
+/** Leaves those that the method has, spelled as it has them; what is wrong with the others is logged. */
+void ObjectManager::State::checkOut(const Method& method, const std::string& provider, std::vector<NamedValue>& out) {
+    std::vector<NamedValue> checked;
+    for (NamedValue& value : out) {
+        const auto parameter =
+            std::find_if(method.parameters.begin(), method.parameters.end(), [&value](const Parameter& known) {
+                return known.out && equalNames(known.name, value.name);
+            });
+        auto converted =
+            parameter == method.parameters.end() ? std::nullopt : convertValue(value.value, parameter->type);
+        if (converted) {
+            checked.push_back({parameter->name, *std::move(converted)});
+        } else {
+            onceLog.say("provider " + provider + ": left out the parameter '" + value.name + "' of type " +
+                        fullTypeName(value.value.type) + ", which " + method.name + " does not give back");
+        }
+    }
+    out = std::move(checked);
+}
+
+Status ObjectManager::State::invoke(const ObjectPath& path, const std::string& name,
+                                    const std::vector<NamedValue>& arguments, MethodAnswer& answer) {
+    const Class& definition = requireClass(schema, path.nameSpace, path.className);
+    const Method& method = requireMethod(definition, name);
+    const ObjectPath checkedPath = requireMethodPath(definition, method, path);
+    const std::vector<NamedValue> checked = requireArguments(method, arguments);
+    Provider& provider =
+        providerOf(ProviderKind::method, path.nameSpace, definition, CMPI_RC_ERR_METHOD_NOT_AVAILABLE, "methods");
+    Status status = ProviderCall(broker, provider, principal).invokeMethod(checkedPath, method.name, checked, answer);
+    if (!status.ok()) {
+        return status;
+    }
+    const std::string& providerName = provider.registration().name;
+    const auto returned = convertValue(answer.returned, method.returnType);
+    if (!returned || returned->isNull()) {
+        return {CMPI_RC_ERR_FAILED,
+                "provider " + providerName + " returned " + toText(answer.returned) + " of type " +
+                    fullTypeName(answer.returned.type) + " from " + method.name + ", which is " +
+                    fullTypeName(method.returnType),
+                {}};
+    }
+    answer.returned = *returned;
+    checkOut(method, providerName, answer.out);
     return status;
 }
 
@@ -256,6 +342,15 @@ Status ObjectManager::enumerateInstanceNames(const std::string& nameSpace, const
 
 Status ObjectManager::getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink) {
     return State::run([&] { return _state->get(path, properties, sink); });
+}
+
+Status ObjectManager::modifyInstance(const Instance& modified, const PropertyList& properties) {
+    return State::run([&] { return _state->modify(modified, properties); });
+}
+
+Status ObjectManager::invokeMethod(const ObjectPath& path, const std::string& method,
+                                   const std::vector<NamedValue>& arguments, MethodAnswer& answer) {
+    return State::run([&] { return _state->invoke(path, method, arguments, answer); });
 }
 
 const Schema& ObjectManager::schema() const {

@@ -31,6 +31,12 @@ std::string statusName(CMPIrc code);
 /** Property names that the client asked for; none asked means all. */
 using PropertyList = std::optional<std::vector<std::string>>;
 
+/** What a method answered: its own value, and its OUT parameters. */
+struct MethodAnswer {
+    Value returned;
+    std::vector<NamedValue> out;
+};
+
 struct ObjectManagerOptions {
     std::string schemaDirectory;   ///< *.mof
     std::string providerDirectory; ///< *.toml, a registration file per provider library
@@ -68,6 +74,25 @@ class ObjectManager {
     Status enumerateInstanceNames(const std::string& nameSpace, const std::string& className, const PathSink& sink);
     /** The instance at a path with all its keys; CMPI_RC_ERR_NOT_FOUND when the provider knows none. */
     Status getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+
+    /**
+     * Changes the instance at `modified.path`, which has all its keys. With a list those properties are changed, to
+     * NULL where `modified` lacks them; without one, those of `modified` that the schema lets be written (qualifier
+     * Write). The provider is given the names and an instance with every property of the class, NULL where it is not
+     * to be changed. A provider that ends in success without saying that it is done has failed.
+     *
+     * Both: values are converted where their type is another but holds them, integers for instance. What a provider
+     * fails at without a reason of its own is answered CMPI_RC_ERR_FAILED with what was logged meanwhile.
+     */
+    Status modifyInstance(const Instance& modified, const PropertyList& properties);
+
+    /**
+     * Calls a method of the instance at a path with all its keys, or of the class itself where the method has the
+     * qualifier Static and the path no keys. `answer` is good when the status is CMPI_RC_OK: a provider that ends in
+     * success without a value of the method's type has failed.
+     */
+    Status invokeMethod(const ObjectPath& path, const std::string& method, const std::vector<NamedValue>& arguments,
+                        MethodAnswer& answer);
 
     [[nodiscard]] const Schema& schema() const;
 

@@ -24,6 +24,21 @@ std::string dlerrorText() {
     return text == nullptr ? "no reason given" : text;
 }
 
+/** Tells an interface, if it was made, that the process ends. */
+template <typename MI>
+void tellEnd(MI*& mi, const CMPIContext& context) {
+    if (mi == nullptr) {
+        return;
+    }
+    try {
+        mi->ft->cleanup(mi, &context, 1);
+    } catch (...) {
+        // Nobody is left to whom a failed cleanup would matter.
+        static_cast<void>(currentExceptionText());
+    }
+    mi = nullptr;
+}
+
 } // namespace
 
 std::string currentExceptionText() {
@@ -97,18 +112,18 @@ CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
     return *_instanceMI;
 }
 
+CMPIMethodMI& Provider::methodMI(const CMPIContext& context) {
+    const std::lock_guard lock(_mutex);
+    if (_methodMI == nullptr) {
+        _methodMI = static_cast<CMPIMethodMI*>(make(_registration.name + "_Create_MethodMI", context));
+    }
+    return *_methodMI;
+}
+
 void Provider::cleanUp(const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
-    if (_instanceMI == nullptr) {
-        return;
-    }
-    try {
-        _instanceMI->ft->cleanup(_instanceMI, &context, 1);
-    } catch (...) {
-        // The process ends: nobody is left to whom a failed cleanup would matter.
-        static_cast<void>(currentExceptionText());
-    }
-    _instanceMI = nullptr;
+    tellEnd(_instanceMI, context);
+    tellEnd(_methodMI, context);
 }
 
 } // namespace marlo

@@ -37,6 +37,8 @@ class Provider {
 
     /** The instance interface, made by its factory the first time. Throws LoadError. */
     CMPIInstanceMI& instanceMI(const CMPIContext& context);
+    /** The method interface; the same. */
+    CMPIMethodMI& methodMI(const CMPIContext& context);
 
     /** Tells the interfaces that were made that the process ends. Calls no provider that was never used. */
     void cleanUp(const CMPIContext& context);
@@ -50,6 +52,7 @@ class Provider {
     std::mutex _mutex; ///< guards all below
     void* _library = nullptr;
     CMPIInstanceMI* _instanceMI = nullptr;
+    CMPIMethodMI* _methodMI = nullptr;
 };
 
 /** The text of the exception that is being handled, of whatever type it is. */

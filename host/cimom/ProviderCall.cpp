@@ -2,6 +2,7 @@
 
 #include "host/cimom/StatusCodes.h"
 
+#include <optional>
 #include <utility>
 
 namespace marlo {
@@ -11,8 +12,11 @@ namespace {
 /** Takes over what a provider returns and remembers an error that it gives in place of a status. */
 class Collector final : public broker::ResultSink {
   public:
-    Collector(const ProviderCall::InstanceSink* instances, const ProviderCall::PathSink* paths)
-        : _instances(instances), _paths(paths) {}
+    Collector() = default;
+
+    explicit Collector(const ProviderCall::InstanceSink& instances) : _instances(&instances) {}
+
+    explicit Collector(const ProviderCall::PathSink& paths) : _paths(&paths) {}
 
     void instance(const CMPIInstance& instance) override {
         if (_instances != nullptr) {
@@ -26,21 +30,24 @@ class Collector final : public broker::ResultSink {
         }
     }
 
-    void data(const CMPIData& /*data*/) override {}
+    void data(const CMPIData& data) override { value = broker::Broker::toModel(data); }
 
     void error(CMPIrc code, const std::string& message) override { _error = {code, message, {}}; }
 
-    [[nodiscard]] const Status& error() const { return _error; }
+    /** The status of the call, or the error that was returned in its place. */
+    [[nodiscard]] Status statusOf(const Status& status) const { return status.ok() ? _error : status; }
+
+    std::optional<Value> value; ///< the last one that was returned
 
   private:
-    const ProviderCall::InstanceSink* _instances;
-    const ProviderCall::PathSink* _paths;
+    const ProviderCall::InstanceSink* _instances = nullptr;
+    const ProviderCall::PathSink* _paths = nullptr;
     Status _error;
 };
 
 } // namespace
 
-/** What every MI function of instances takes. */
+/** What every MI function takes. */
 struct ProviderCall::Arguments {
     const CMPIContext* context;
     const CMPIResult* result;
@@ -64,7 +71,7 @@ Status ProviderCall::statusOf(const CMPIStatus& answered) const {
 }
 
 Status ProviderCall::call(const ObjectPath& path, const PropertyList& properties, broker::ResultSink& sink,
-                          const Function& function) {
+                          const Function& function, bool* isDone) {
     const broker::CallScope scope;
     CMPIContext* context = _broker.newContext();
     _broker.addEntry(context, CMPIInvocationFlags, Value::uint(CMPI_uint32, 0));
@@ -82,8 +89,7 @@ Status ProviderCall::call(const ObjectPath& path, const PropertyList& properties
                               properties ? names.data() : nullptr};
     Status status;
     try {
-        CMPIInstanceMI& mi = _provider.instanceMI(*context);
-        status = statusOf(function(mi, arguments));
+        status = statusOf(function(arguments));
     } catch (const LoadError& error) {
         status = {CMPI_RC_ERR_FAILED, error.what(), {}};
     } catch (...) {
@@ -92,34 +98,72 @@ Status ProviderCall::call(const ObjectPath& path, const PropertyList& properties
                   {}};
     }
     result.rethrow();
+    if (isDone != nullptr) {
+        *isDone = result.isDone();
+    }
     return status;
 }
 
 Status ProviderCall::enumerateInstances(const ObjectPath& classPath, const PropertyList& properties,
                                         const InstanceSink& sink) {
-    Collector collector(&sink, nullptr);
-    const Status status = call(classPath, properties, collector, [](CMPIInstanceMI& mi, const Arguments& arguments) {
+    Collector collector(sink);
+    return collector.statusOf(call(classPath, properties, collector, [this](const Arguments& arguments) {
+        CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
         return mi.ft->enumerateInstances(&mi, arguments.context, arguments.result, arguments.path,
                                          arguments.properties);
-    });
-    return status.ok() ? collector.error() : status;
+    }));
 }
 
 Status ProviderCall::enumerateInstanceNames(const ObjectPath& classPath, const PathSink& sink) {
-    Collector collector(nullptr, &sink);
-    const Status status =
-        call(classPath, std::nullopt, collector, [](CMPIInstanceMI& mi, const Arguments& arguments) {
-            return mi.ft->enumerateInstanceNames(&mi, arguments.context, arguments.result, arguments.path);
-        });
-    return status.ok() ? collector.error() : status;
+    Collector collector(sink);
+    return collector.statusOf(call(classPath, std::nullopt, collector, [this](const Arguments& arguments) {
+        CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
+        return mi.ft->enumerateInstanceNames(&mi, arguments.context, arguments.result, arguments.path);
+    }));
 }
 
 Status ProviderCall::getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink) {
-    Collector collector(&sink, nullptr);
-    const Status status = call(path, properties, collector, [](CMPIInstanceMI& mi, const Arguments& arguments) {
+    Collector collector(sink);
+    return collector.statusOf(call(path, properties, collector, [this](const Arguments& arguments) {
+        CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
         return mi.ft->getInstance(&mi, arguments.context, arguments.result, arguments.path, arguments.properties);
-    });
-    return status.ok() ? collector.error() : status;
+    }));
+}
+
+Status ProviderCall::modifyInstance(const Instance& instance, const std::vector<std::string>& names) {
+    Collector collector;
+    bool isDone = false;
+    const Status status = collector.statusOf(call(
+        instance.path, names, collector,
+        [&](const Arguments& arguments) {
+            CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
+            return mi.ft->modifyInstance(&mi, arguments.context, arguments.result, arguments.path,
+                                         _broker.newInstance(instance), arguments.properties);
+        },
+        &isDone));
+    return status.ok() && !isDone ? Status{CMPI_RC_ERR_FAILED, "", {}} : status;
+}
+
+Status ProviderCall::invokeMethod(const ObjectPath& path, const std::string& method,
+                                  const std::vector<NamedValue>& arguments, MethodAnswer& answer) {
+    Collector collector;
+    bool isDone = false;
+    const Status status = collector.statusOf(call(
+        path, std::nullopt, collector,
+        [&](const Arguments& prepared) {
+            CMPIMethodMI& mi = _provider.methodMI(*prepared.context);
+            CMPIArgs* out = _broker.newArgs({});
+            const CMPIStatus answered = mi.ft->invokeMethod(&mi, prepared.context, prepared.result, prepared.path,
+                                                            method.c_str(), _broker.newArgs(arguments), out);
+            answer.out = broker::Broker::toModel(*out);
+            return answered;
+        },
+        &isDone));
+    if (!status.ok() || (isDone && collector.value)) {
+        answer.returned = std::move(collector.value).value_or(Value{});
+        return status;
+    }
+    return {CMPI_RC_ERR_FAILED, "", {}};
 }
 
 } // namespace marlo

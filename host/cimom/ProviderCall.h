@@ -1,6 +1,6 @@
 /**
  * @file
- * One call of one provider's instance interface.
+ * One call of one provider's instance or method interface.
  */
 #pragma once
 
@@ -9,6 +9,7 @@
 #include "host/cimom/Provider.h"
 
 #include <functional>
+#include <vector>
 
 namespace marlo {
 
@@ -30,12 +31,21 @@ class ProviderCall {
     Status enumerateInstanceNames(const ObjectPath& classPath, const PathSink& sink);
     Status getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
 
+    /**
+     * A provider that ends either of these in success, but has not said that it is done, has failed: the status is
+     * then CMPI_RC_ERR_FAILED with an empty message, for the caller to give the reason.
+     */
+    Status modifyInstance(const Instance& instance, const std::vector<std::string>& names);
+    /** `answer` gets what the provider returned, and is complete when the status is CMPI_RC_OK. */
+    Status invokeMethod(const ObjectPath& path, const std::string& method, const std::vector<NamedValue>& arguments,
+                        MethodAnswer& answer);
+
   private:
     struct Arguments;
-    using Function = std::function<CMPIStatus(CMPIInstanceMI&, const Arguments&)>;
+    using Function = std::function<CMPIStatus(const Arguments&)>;
 
     Status call(const ObjectPath& path, const PropertyList& properties, broker::ResultSink& sink,
-                const Function& function);
+                const Function& function, bool* isDone = nullptr);
     Status statusOf(const CMPIStatus& answered) const;
 
     const broker::Broker& _broker;

@@ -159,7 +159,7 @@ TEST_F(ObjectManagerTest, RefusesClassesThatNobodyServes) {
            "no provider serves the instances of Test_Unserved in root/test");
     expect(names("Test_Unserved"), CMPI_RC_ERR_NOT_SUPPORTED, "Test_Unserved");
     expect(get("root/test:Test_Unserved.Id=\"x\""), CMPI_RC_ERR_NOT_SUPPORTED, "Test_Unserved");
-    expect(get("root/test:Test_Base"), CMPI_RC_ERR_NOT_SUPPORTED, "Test_Base itself");
+    expect(get("root/test:Test_Base"), CMPI_RC_ERR_NOT_SUPPORTED, "the instances of Test_Base in root/test");
 }
 
 struct BadKeys {

@@ -41,10 +41,15 @@ class ProviderSite {
 
     void write(const std::string& file, const std::string& text) const { std::ofstream(_directory / file) << text; }
 
-    /** A registration file of one instance provider in "root/test". */
-    void provide(const std::string& library, const std::string& provider, const std::string& className) const {
+    /** A registration file of one provider in "root/test". */
+    void provide(const std::string& library, const std::string& provider, const std::string& className,
+                 const std::vector<std::string>& kinds = {"instance"}) const {
+        std::string list;
+        for (const std::string& kind : kinds) {
+            list += (list.empty() ? "\"" : ", \"") + kind + "\"";
+        }
         write("providers/" + provider + ".toml", "library = \"" + library + "\"\n[[provider]]\nname = \"" + provider +
-                                                     "\"\nkinds = [\"instance\"]\nnamespaces = [\"root/test\"]\n" +
+                                                     "\"\nkinds = [" + list + "]\nnamespaces = [\"root/test\"]\n" +
                                                      "classes = [\"" + className + "\"]\n");
     }
 

@@ -1,0 +1,166 @@
+#include "host/cimom/ChangeChecks.h"
+
+#include <algorithm>
+
+namespace marlo {
+
+namespace {
+
+bool isTrue(const Qualifiers& qualifiers, std::string_view name) {
+    const Qualifier* found = findQualifier(qualifiers, name);
+    const bool* truth = found == nullptr ? nullptr : std::get_if<bool>(&found->value.data);
+    return truth != nullptr && *truth;
+}
+
+bool isAsked(const PropertyList& properties, const std::string& name) {
+    return std::any_of(properties->begin(), properties->end(),
+                       [&name](const std::string& asked) { return equalNames(asked, name); });
+}
+
+[[noreturn]] void refuse(const std::string& reason) {
+    throw RequestError(CMPI_RC_ERR_INVALID_PARAMETER, reason);
+}
+
+const Property& requireProperty(const Class& definition, const std::string& name) {
+    const Property* property = definition.findProperty(name);
+    if (property == nullptr) {
+        throw RequestError(CMPI_RC_ERR_NO_SUCH_PROPERTY, definition.name + " has no property '" + name + "'");
+    }
+    return *property;
+}
+
+Value requireType(const std::string& what, const Value& value, CMPIType type) {
+    auto converted = convertValue(value, type);
+    if (!converted) {
+        refuse(what + " is of type " + fullTypeName(type) + ", which " + toText(value) + " is not");
+    }
+    return *std::move(converted);
+}
+
+/** The names to be changed. */
+std::vector<std::string> namesToChange(const Class& definition, const Instance& modified,
+                                       const PropertyList& properties) {
+    std::vector<std::string> names;
+    const auto add = [&names](const std::string& name) {
+        if (std::find(names.begin(), names.end(), name) == names.end()) {
+            names.push_back(name);
+        }
+    };
+    if (!properties) {
+        for (const NamedValue& given : modified.properties) {
+            const Property& property = requireProperty(definition, given.name);
+            if (isTrue(property.qualifiers, "Write") && !property.key) {
+                add(property.name);
+            }
+        }
+        return names;
+    }
+    for (const std::string& name : *properties) {
+        const Property& property = requireProperty(definition, name);
+        if (!property.key && !isTrue(property.qualifiers, "Write")) {
+            refuse(definition.name + "." + property.name + " cannot be changed");
+        }
+        if (!property.key) {
+            add(property.name);
+        }
+    }
+    return names;
+}
+
+void requireSameKey(const Class& definition, const Property& key, const NamedValue& given, const ObjectPath& path) {
+    const NamedValue* inPath = findName(path.keys, key.name);
+    const Value value = requireType(definition.name + "." + key.name, given.value, key.type);
+    if (inPath == nullptr || !(inPath->value == value)) {
+        refuse("the key " + key.name + " of an instance of " + definition.name + " cannot be changed");
+    }
+}
+
+} // namespace
+
+std::string fullTypeName(CMPIType type) {
+    const std::string name = type == CMPI_null ? "none" : typeName(type);
+    return (type & CMPI_ARRAY) != 0 ? name + "[]" : name;
+}
+
+std::optional<Value> convertValue(const Value& value, CMPIType type) {
+    if (value.isNull()) {
+        return Value::null(type);
+    }
+    if ((type & CMPI_ARRAY) == 0) {
+        return value.isArray() ? std::nullopt : convertKey(value, type);
+    }
+    const auto* given = std::get_if<Value::Array>(&value.data);
+    if (given == nullptr) {
+        return std::nullopt;
+    }
+    Value::Array elements;
+    for (const Value& element : *given) {
+        auto converted = convertValue(element, static_cast<CMPIType>(type & ~CMPI_ARRAY));
+        if (!converted) {
+            return std::nullopt;
+        }
+        elements.push_back(*std::move(converted));
+    }
+    return Value{type, std::move(elements)};
+}
+
+Modification requireModification(const Class& definition, const Instance& modified, const PropertyList& properties) {
+    Modification modification;
+    modification.instance.path = modified.path;
+    modification.names = namesToChange(definition, modified, properties);
+    for (const NamedValue& given : modified.properties) {
+        const Property& property = requireProperty(definition, given.name);
+        if (property.key) {
+            requireSameKey(definition, property, given, modified.path);
+        }
+    }
+    for (const Property& property : definition.properties) {
+        const NamedValue* given = findName(property.key ? modified.path.keys : modified.properties, property.name);
+        const bool isChanged = property.key || isAsked(modification.names, property.name);
+        modification.instance.properties.push_back(
+            {property.name, given != nullptr && isChanged
+                                ? requireType(definition.name + "." + property.name, given->value, property.type)
+                                : Value::null(property.type)});
+    }
+    return modification;
+}
+
+const Method& requireMethod(const Class& definition, const std::string& name) {
+    const Method* method = definition.findMethod(name);
+    if (method == nullptr) {
+        throw RequestError(CMPI_RC_ERR_METHOD_NOT_FOUND, definition.name + " has no method '" + name + "'");
+    }
+    return *method;
+}
+
+ObjectPath requireMethodPath(const Class& definition, const Method& method, const ObjectPath& path) {
+    if (path.keys.empty() && isTrue(method.qualifiers, "Static")) {
+        return {"", path.nameSpace, definition.name, {}};
+    }
+    return requireKeys(definition, path.nameSpace, path);
+}
+
+std::vector<NamedValue> requireArguments(const Method& method, const std::vector<NamedValue>& arguments) {
+    for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
+        const bool isTaken =
+            std::any_of(method.parameters.begin(), method.parameters.end(), [&](const Parameter& parameter) {
+                return parameter.in && equalNames(parameter.name, argument->name);
+            });
+        if (!isTaken) {
+            refuse(method.name + " takes no parameter '" + argument->name + "'");
+        }
+        if (findName(arguments, argument->name) != &*argument) {
+            refuse(method.name + " takes one parameter " + argument->name + ", which is given twice");
+        }
+    }
+    std::vector<NamedValue> checked;
+    for (const Parameter& parameter : method.parameters) {
+        if (const NamedValue* given = findName(arguments, parameter.name); given != nullptr) {
+            checked.push_back({parameter.name, requireType("the parameter " + parameter.name + " of " + method.name,
+                                                           given->value, parameter.type)});
+        }
+    }
+    return checked;
+}
+
+} // namespace marlo
