@@ -2,9 +2,13 @@
  * @file
  * The CMPI provider of MARLO_NetworkAdapterConfiguration: instances, methods and indications.
  */
+#include "indication/NetworkIndication.h"
 #include "providers/ProviderExport.h"
 #include "providers/ReadOperations.h"
 #include "providers/WriteOperations.h"
+#include "trace/Trace.h"
+
+#include <cmpimacs.h>
 
 namespace Orv::NetworkAdapterComposite {
 
@@ -17,6 +21,13 @@ constexpr const char* ENUMERATION_FAILURE = "getAllNetworkAdapterCMPIInstances F
 
 /** The object manager as the latest factory call gave it; never released. */
 const CMPIBroker* broker = nullptr;
+
+/** The class of an indication path; empty when the object manager has none. `status` is that of the last call. */
+std::string indicationClass(const CMPIObjectPath* classPath, CMPIStatus* status) {
+    const CMPIString* name = CMGetClassName(classPath, status);
+    const char* text = name != nullptr ? CMGetCharsPtr(name, status) : nullptr;
+    return text != nullptr ? text : "";
+}
 
 } // namespace
 
@@ -87,34 +98,72 @@ CMPIStatus NetworkAdapter_IndicationCleanup(CMPIIndicationMI* /*mi*/, const CMPI
 CMPIStatus NetworkAdapter_AuthorizeFilter(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,
                                           const CMPISelectExp* /*filter*/, const char* /*className*/,
                                           const CMPIObjectPath* /*classPath*/, const char* /*owner*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return {CMPI_RC_OK, nullptr};
 }
 
 /** Some object managers pass a sixth argument; none is looked at. */
 CMPIStatus NetworkAdapter_MustPoll(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,
                                    const CMPISelectExp* /*filter*/, const char* /*className*/,
                                    const CMPIObjectPath* /*classPath*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return {CMPI_RC_OK, nullptr};
 }
 
-CMPIStatus NetworkAdapter_ActivateFilter(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,
+/** The class of the path counts, whatever the filter and its class name say; selecting by filter is not done here. */
+CMPIStatus NetworkAdapter_ActivateFilter(CMPIIndicationMI* /*mi*/, const CMPIContext* context,
                                          const CMPISelectExp* /*filter*/, const char* /*className*/,
-                                         const CMPIObjectPath* /*classPath*/, CMPIBoolean /*firstActivation*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+                                         const CMPIObjectPath* classPath, CMPIBoolean /*firstActivation*/) {
+    const ProviderLog log(loggerNetworkProvider, UNIT, __func__);
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    CMPIStatus status = {CMPI_RC_OK, nullptr};
+    unsigned short id = INDICATION_NONE;
+    const std::string className = indicationClass(classPath, &status);
+    log.variable("className", className);
+    if (!getNetworkIndicationId(className.c_str(), id)) {
+        log.message(LEVEL_FAILURE, "The Given Class does not support indication");
+        status = {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    } else {
+        saveIndicationContext(broker, CBPrepareAttachThread(broker, context));
+        subscribeforEvent(id);
+    }
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return status;
 }
 
 CMPIStatus NetworkAdapter_DeActivateFilter(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,
                                            const CMPISelectExp* /*filter*/, const char* /*className*/,
-                                           const CMPIObjectPath* /*classPath*/, CMPIBoolean /*lastActivation*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+                                           const CMPIObjectPath* classPath, CMPIBoolean /*lastActivation*/) {
+    const ProviderLog log(loggerNetworkProvider, UNIT, __func__);
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    CMPIStatus status = {CMPI_RC_OK, nullptr};
+    unsigned short id = INDICATION_NONE;
+    const std::string className = indicationClass(classPath, &status);
+    log.variable("className", className);
+    if (!getNetworkIndicationId(className.c_str(), id)) {
+        log.message(LEVEL_FAILURE, "The Given Class does not support Indication");
+        status = {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    } else {
+        UnsubscribeforEvent(id);
+    }
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return status;
 }
 
 CMPIStatus NetworkAdapter_EnableIndications(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    setNetworkEnable();
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return {CMPI_RC_OK, nullptr};
 }
 
 CMPIStatus NetworkAdapter_DisableIndications(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, nullptr};
+    markProviderEntry(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    disableNetworkIndication();
+    markProviderExit(loggerNetworkProvider, UNIT, __func__, __LINE__);
+    return {CMPI_RC_OK, nullptr};
 }
 
 CMPIStatus NetworkAdapter_AuthorizeFilterCollection(CMPIIndicationMI* /*mi*/, const CMPIContext* /*context*/,

@@ -28,6 +28,17 @@ Platform::Outcome Platform::enumerateInstances(const ObjectPath& classPath, cons
     return outcome;
 }
 
+Platform::Outcome Platform::deliverIndication(const std::string& nameSpace, Instance&& indication) {
+    const std::lock_guard lock(_mutex);
+    _delivered.emplace_back(nameSpace, std::move(indication));
+    return deliveryOutcome;
+}
+
+Platform::Delivered Platform::delivered() const {
+    const std::lock_guard lock(_mutex);
+    return _delivered;
+}
+
 namespace {
 
 Instance platformInstance(const std::string& className, const std::vector<std::string>& texts) {

@@ -55,7 +55,8 @@ class Platform final : public marlo::broker::UpCalls {
 
     std::vector<marlo::Instance> cards;
     std::vector<marlo::Instance> ports;
-    Outcome outcome; ///< how enumerations end
+    Outcome outcome;         ///< how enumerations end
+    Outcome deliveryOutcome; ///< how deliveries end
     /** Paths asked for, and whether a property list was given; kept in order while calls come one at a time. */
     std::vector<std::pair<std::string, bool>> enumerations;
 
@@ -70,12 +71,15 @@ class Platform final : public marlo::broker::UpCalls {
         return {CMPI_RC_ERR_NOT_SUPPORTED, {}};
     }
 
-    Outcome deliverIndication(const std::string&, marlo::Instance&&) override {
-        return {CMPI_RC_ERR_NOT_SUPPORTED, {}};
-    }
+    Outcome deliverIndication(const std::string& nameSpace, marlo::Instance&& indication) override;
+
+    /** Namespace and instance of every delivery so far, failed ones too. */
+    using Delivered = std::vector<std::pair<std::string, marlo::Instance>>;
+    [[nodiscard]] Delivered delivered() const;
 
   private:
-    std::mutex _mutex; ///< guards enumerations while calls come from several threads
+    mutable std::mutex _mutex; ///< guards enumerations and what is delivered while calls come from several threads
+    Delivered _delivered;
 };
 
 /** An instance of TAVIS_NetworkCard with every property that is copied from it. */

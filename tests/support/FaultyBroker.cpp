@@ -163,18 +163,24 @@ void putAll(CMPIBrokerEncFT& table) {
     PUT(CMPIBrokerEncFT, trace, "");
 }
 
+void putAll(CMPIBrokerExtFT& table) {
+    PUT(CMPIBrokerExtFT, newThread, "");
+}
+
 } // namespace
 
 FaultyBroker::FaultyBroker(const broker::Broker& real)
-    : _handle(*real.handle()), _broker(*_handle.bft), _factory(*_handle.eft) {
+    : _handle(*real.handle()), _broker(*_handle.bft), _factory(*_handle.eft), _threads(*_handle.xft) {
     if (inForce != nullptr) {
         throw std::logic_error("two faulty brokers at a time");
     }
     inForce = this;
     putAll(_broker);
     putAll(_factory);
+    putAll(_threads);
     _handle.bft = &_broker;
     _handle.eft = &_factory;
+    _handle.xft = &_threads;
 }
 
 FaultyBroker::~FaultyBroker() {
@@ -191,6 +197,7 @@ CMPIObjectPath* FaultyBroker::adopt(CMPIObjectPath* path) {
         PUT(CMPIObjectPathFT, getNameSpace, "objectPath.");
         PUT(CMPIObjectPathFT, setHostname, "objectPath.");
         PUT(CMPIObjectPathFT, getClassName, "objectPath.");
+        PUT(CMPIObjectPathFT, addKey, "objectPath.");
         PUT(CMPIObjectPathFT, getKey, "objectPath.");
         PUT(CMPIObjectPathFT, getKeyAt, "objectPath.");
         PUT(CMPIObjectPathFT, getKeyCount, "objectPath.");

@@ -25,8 +25,9 @@ enum class Failure {
 };
 
 /**
- * A handle of its own on a broker. Slots are named after the function tables: "newInstance", "enumerateInstances" and
- * so on for the broker's, "instance.setProperty", "objectPath.getKeyCount", "array.setElementAt", "args.getArg",
+ * A handle of its own on a broker. Slots are named after the function tables: "newInstance", "enumerateInstances",
+ * "newThread" and so on for the broker's, "instance.setProperty", "objectPath.getKeyCount", "array.setElementAt",
+ * "args.getArg",
  * "string.getCharPtr", "enumeration.getNext", "result.returnInstance" for those of encapsulated objects, which pass
  * through this broker by being created by it or by adopt(). The real slot does the work of every call that does not
  * fail.
@@ -80,6 +81,7 @@ class FaultyBroker {
     CMPIBroker _handle;
     CMPIBrokerFT _broker;
     CMPIBrokerEncFT _factory;
+    CMPIBrokerExtFT _threads;
     mutable std::mutex _mutex; ///< guards what follows
     std::vector<std::string> _calls;
     std::map<std::string, int> _counts;

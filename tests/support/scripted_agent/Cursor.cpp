@@ -159,6 +159,7 @@ void Instrumentation::selectNode(const std::string& path) {
     if (found != script().nodes.end()) {
         _state->selection.push_back(&*found);
     }
+    scripted_agent::pickUp(path);
 }
 
 Instrumentation::operator bool() const {
@@ -212,13 +213,15 @@ std::string Instrumentation::getPathToParentNode() {
 }
 
 void Instrumentation::startMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
-    _state->called([&] { return "startMonitoring(" + nameOf(type) + ")"; });
-    script().monitorings.push_back({type, callback, context});
+    _state->called(
+        [&] { return "startMonitoring(" + nameOf(type) + (context == nullptr ? ", null)" : ", context)"); });
+    scripted_agent::addMonitoring({type, callback, context});
 }
 
 void Instrumentation::stopMonitoring(NodeLexicon::NodeType type, MonitoringCallback callback, const void* context) {
-    _state->called([&] { return "stopMonitoring(" + nameOf(type) + ")"; });
-    std::erase(script().monitorings, scripted_agent::Monitoring{type, callback, context});
+    _state->called(
+        [&] { return "stopMonitoring(" + nameOf(type) + (context == nullptr ? ", null)" : ", context)"); });
+    scripted_agent::removeMonitoring({type, callback, context});
 }
 
 struct DateTime::State {

@@ -4,6 +4,8 @@
  */
 #pragma once
 
+#include "tests/support/scripted_agent/ScriptedAgent.h"
+
 #include <string>
 
 namespace scripted_agent {
@@ -33,5 +35,15 @@ int nextCursor();
 
 /** The text in quotation marks, or null. */
 std::string quoted(const char* text);
+
+/** What startMonitoring and stopMonitoring do; stopping waits until no callback is running. */
+void addMonitoring(const Monitoring& monitoring);
+void removeMonitoring(const Monitoring& monitoring);
+
+/** Tells who waits for it that a cursor has selected `path`. */
+void pickUp(const std::string& path);
+
+/** Ends every monitoring, and forgets what was picked up. */
+void resetEvents();
 
 } // namespace scripted_agent

@@ -31,6 +31,7 @@ Script& script() {
 
 void reset() {
     script() = Script();
+    resetEvents();
     clearRecord();
 }
 

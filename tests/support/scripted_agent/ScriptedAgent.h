@@ -16,7 +16,7 @@
  *
  * The `over` part is there when the caller's variable was not empty.
  *
- * A script is set up while no provider call is running; recording is safe from any thread.
+ * A script is set up while no provider call is running; recording and monitoring are safe from any thread.
  */
 #pragma once
 
@@ -50,6 +50,13 @@ struct Monitoring {
     bool operator==(const Monitoring&) const = default;
 };
 
+/** What the callbacks of monitorings are called with. */
+struct Event {
+    unsigned int code = 0;
+    Orv::DateTime::Fields time{};
+    std::string path{};
+};
+
 struct Script {
     std::vector<Node> nodes; ///< selections have them in this order; of several with one path the first is found
     bool recording = true;
@@ -64,7 +71,9 @@ struct Script {
     std::function<bool(const CMPIObjectPath*, const CMPIObjectPath*, bool)> isObjPathsEqual;
     std::function<void(CMPIData, CMPIInstance*, const char*, Orv::DataType, CMPIStatus*)> mapProperty;
 
-    std::vector<Monitoring> monitorings;
+    unsigned int languageId = 7;
+    std::map<std::wstring, std::wstring> messages; ///< texts by resource id; all that there are
+    std::wstring uid = L"4c4c4544-0042";
 };
 
 /** The script in force. */
@@ -84,6 +93,20 @@ ORV_API std::vector<std::string> recorded(std::string_view prefix);
 
 /** Adds a line of the test's own, to show what happened between the agent's calls. */
 ORV_API void note(std::string line);
+
+/** Every startMonitoring that was not stopped, in order, even those that repeat each other. */
+ORV_API std::vector<Monitoring> monitorings();
+
+enum class PickUp {
+    ignored, ///< the next event follows at once
+    awaited, ///< the next event follows when a cursor has selected the path of this one
+};
+
+/**
+ * Calls the callback of every monitoring of adapters, once for those that repeat each other, for each event in turn
+ * on a thread of the agent's own. Returns when the last has been handed over (and picked up).
+ */
+ORV_API void fire(const std::vector<Event>& events, PickUp pickUp = PickUp::ignored);
 
 /** Has the `nth` (from 1) call that begins with `call` run `failure`, which throws what it likes. */
 ORV_API void failAt(std::string call, int nth, std::function<void()> failure);

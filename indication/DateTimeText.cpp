@@ -1,0 +1,55 @@
+#include "indication/NetworkIndication.h"
+#include "trace/Trace.h"
+
+#include <array>
+#include <cstdio>
+
+namespace Orv::NetworkAdapterComposite {
+
+namespace {
+
+/** Five characters and the zero that ends them; what does not fit is cut. */
+using FieldText = std::array<char, 6>;
+
+constexpr std::size_t CALENDAR_WIDTH = 2;
+constexpr std::size_t FRACTION_WIDTH = 6;
+constexpr std::size_t OFFSET_WIDTH = 3;
+constexpr int MINUTES_PER_HOUR = 60;
+
+std::string number(unsigned int value) {
+    FieldText text{};
+    (void)std::snprintf(text.data(), text.size(), "%u", value);
+    return text.data();
+}
+
+std::string filledUp(const std::string& text, std::size_t width) {
+    return text.size() < width ? addZero(static_cast<unsigned char>(width - text.size())) + text : text;
+}
+
+/** The sign of a positive offset stands before the zeros; that of a negative one is part of what they fill up. */
+std::string offsetText(int hours) {
+    FieldText text{};
+    (void)std::snprintf(text.data(), text.size(), "%d", hours * MINUTES_PER_HOUR);
+    const std::string minutes = text.data();
+    return (minutes.find('-') == std::string::npos ? "+" : "") + filledUp(minutes, OFFSET_WIDTH);
+}
+
+} // namespace
+
+std::string convertCIMDateTime(Orv::DateTime time) {
+    const ProviderLog log(loggerNetworkIndication, INDICATION_UNIT, __func__);
+    log.entering();
+    std::string text = number(time.getYear());
+    for (const unsigned int field :
+         {time.getMonth(), time.getDay(), time.getHour(), time.getMinute(), time.getSecond()}) {
+        text += filledUp(number(field), CALENDAR_WIDTH);
+    }
+    text += "." + filledUp(number(time.getMillisecond()), FRACTION_WIDTH);
+    return text + offsetText(time.getOffset());
+}
+
+std::string addZero(unsigned char count) {
+    return std::string(count, '0'); // NOLINT(modernize-return-braced-init-list): braces would make it two characters
+}
+
+} // namespace Orv::NetworkAdapterComposite
