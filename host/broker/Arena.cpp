@@ -85,6 +85,11 @@ void* Arena::allocateBlock(Part& part, std::size_t bytes) {
     return memory;
 }
 
+void Arena::keep(std::shared_ptr<const void> thing) {
+    const std::lock_guard lock(_mutex);
+    _kept.push_back(std::move(thing));
+}
+
 StringObject** Arena::nameCache() {
     if (!isOwner()) {
         return nullptr;

@@ -14,6 +14,7 @@
 #include <type_traits>
 #include <unordered_set>
 #include <utility>
+#include <vector>
 
 namespace marlo::broker {
 
@@ -21,7 +22,7 @@ class StringObject;
 
 /**
  * Hands out memory from growing blocks and releases all of it at once. What lies in it is never destroyed one by one,
- * so it must be trivially destructible.
+ * so it must be trivially destructible; what is not is kept beside it.
  *
  * The thread that a call runs on allocates without locking. An object may be changed by another thread than the one
  * whose call owns it; what that takes comes from a part of its own, under a lock.
@@ -57,6 +58,9 @@ class Arena {
     /** Strings by which names that recur in this arena are found again; null when the caller may not use it. */
     StringObject** nameCache();
 
+    /** Keeps a thing alive as long as the arena. */
+    void keep(std::shared_ptr<const void> thing);
+
     static constexpr std::size_t nameCacheSize = 64; ///< a power of two
 
     /** The object whose release ends this arena; null for the arena of a call, whose objects end with the call. */
@@ -91,8 +95,9 @@ class Arena {
     std::thread::id _owner;
     Part _own;
     Part _shared;
-    std::mutex _mutex; ///< guards _shared and _pieces
+    std::mutex _mutex; ///< guards _shared, _pieces and _kept
     std::unordered_set<void*> _pieces;
+    std::vector<std::shared_ptr<const void>> _kept;
     StringObject** _names = nullptr;
     const void* _root = nullptr;
 };

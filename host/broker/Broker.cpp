@@ -1,5 +1,6 @@
 #include "host/broker/BrokerState.h"
 #include "host/broker/Convert.h"
+#include "host/filter/Filter.h"
 
 #include <iostream>
 #include <sstream>
@@ -93,6 +94,10 @@ CMPIArgs* Broker::newArgs(const std::vector<NamedValue>& arguments) const {
         object->values.set(argument.name, toData(arena, *_state, argument.value));
     }
     return &object->handle;
+}
+
+CMPISelectExp* Broker::newSelectExp(const filter::Filter& filter) const {
+    return &SelectExpObject::make(currentArena(), *_state, std::make_shared<const filter::Filter>(filter))->handle;
 }
 
 void Broker::addEntry(CMPIContext* context, const std::string& name, const Value& value) const {

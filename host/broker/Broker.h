@@ -17,6 +17,10 @@
 
 #include <cmpift.h>
 
+namespace marlo::filter {
+class Filter;
+}
+
 namespace marlo::broker {
 
 /** How an operation that a provider asked for ended. */
@@ -86,6 +90,7 @@ class Broker {
     [[nodiscard]] CMPIObjectPath* newObjectPath(const ObjectPath& path) const;
     [[nodiscard]] CMPIInstance* newInstance(const Instance& instance) const;
     [[nodiscard]] CMPIArgs* newArgs(const std::vector<NamedValue>& arguments) const;
+    [[nodiscard]] CMPISelectExp* newSelectExp(const filter::Filter& filter) const;
     /** Sets an entry of a context. */
     void addEntry(CMPIContext* context, const std::string& name, const Value& value) const;
 

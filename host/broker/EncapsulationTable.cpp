@@ -8,6 +8,7 @@
 #include "host/broker/Slot.h"
 #include "host/broker/Unsupported.h"
 #include "host/broker/Values.h"
+#include "host/filter/Filter.h"
 #include "host/model/DateTimeText.h"
 
 #include <chrono>
@@ -85,6 +86,40 @@ CMPIDateTime* newDateTimeFromChars(CMPIStatus& status, BrokerState& /*broker*/, 
     return &DateTimeObject::make(currentArena(), text, value->microseconds, value->interval)->handle;
 }
 
+/** The names behind SELECT as an array of texts; null where all are asked for. */
+CMPIArray* projectionOf(const filter::Filter& filter) {
+    if (filter.properties().empty()) {
+        return nullptr;
+    }
+    auto* array = ArrayObject::make(currentArena(), static_cast<CMPICount>(filter.properties().size()), CMPI_string);
+    for (CMPICount i = 0; i < array->count; ++i) {
+        array->elements[i].state = CMPI_goodValue;
+        array->elements[i].value.string = &StringObject::make(currentArena(), filter.properties()[i])->handle;
+    }
+    return &array->handle;
+}
+
+/** A filter that is not compared with the schema: there is no namespace to look its class up in. */
+CMPISelectExp* newSelectExp(CMPIStatus& status, BrokerState& broker, const char* query, const char* language,
+                            CMPIArray** projection) {
+    if (query == nullptr || language == nullptr) {
+        status.rc = CMPI_RC_ERR_INVALID_PARAMETER;
+        return nullptr;
+    }
+    try {
+        auto filter =
+            std::make_shared<const filter::Filter>(filter::Filter::parse(query, filter::readLanguage(language)));
+        if (projection != nullptr) {
+            *projection = projectionOf(*filter);
+        }
+        return &SelectExpObject::make(currentArena(), broker, std::move(filter))->handle;
+    } catch (const filter::Error& error) {
+        status.rc = error.code();
+        status.msg = &StringObject::make(currentArena(), error.what())->handle;
+        return nullptr;
+    }
+}
+
 CMPIBoolean classPathIsA(CMPIStatus& status, BrokerState& broker, const CMPIObjectPath* handle,
                          const char* className) {
     const auto* path = objectOf<ObjectPathObject>(handle);
@@ -130,6 +165,8 @@ const char* typeOf(const void* handle) {
         return "CMPIError";
     case Kind::broker:
         return "CMPIBroker";
+    case Kind::selectExp:
+        return "CMPISelectExp";
     }
     return nullptr;
 }
@@ -164,6 +201,8 @@ std::string describe(const ObjectBase& object, const char* type) {
         return toModel(static_cast<const ObjectPathObject&>(object)).toString();
     case Kind::instance:
         return instanceText(static_cast<const InstanceObject&>(object));
+    case Kind::selectExp:
+        return static_cast<const SelectExpObject&>(object).filter->text();
     default:
         return type;
     }
@@ -244,7 +283,7 @@ const CMPIBrokerEncFT encapsulationTable = {
     slot<newDateTime>,
     slot<newDateTimeFromBinary>,
     slot<newDateTimeFromChars>,
-    unsupported<decltype(CMPIBrokerEncFT::newSelectExp)>,
+    slot<newSelectExp>,
     slot<classPathIsA>,
     slot<toString>,
     slot<isOfType>,

@@ -63,9 +63,6 @@ void freeObject(const CMPIBroker* /*broker*/, typename O::Handle* handle) {
     releaseSlot<O>(handle);
 }
 
-/** There are no select expressions to free: none can be made. */
-void freeSelectExp(const CMPIBroker* /*broker*/, CMPISelectExp* /*expression*/) {}
-
 } // namespace
 
 const CMPIBrokerMemFT memoryTable = {
@@ -83,7 +80,7 @@ const CMPIBrokerMemFT memoryTable = {
     freeObject<StringObject>,
     freeObject<ArrayObject>,
     freeObject<DateTimeObject>,
-    freeSelectExp,
+    freeObject<SelectExpObject>,
 };
 
 } // namespace marlo::broker

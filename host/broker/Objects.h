@@ -12,9 +12,14 @@
 #include "host/broker/NamedList.h"
 
 #include <cstdint>
+#include <memory>
 #include <string_view>
 
 #include <cmpift.h>
+
+namespace marlo::filter {
+class Filter;
+}
 
 namespace marlo::broker {
 
@@ -33,6 +38,7 @@ enum class Kind : std::uint32_t {
     result,
     error,
     broker,
+    selectExp,
 };
 
 /** What all objects begin with. */
@@ -102,6 +108,7 @@ extern const CMPIArgsFT argsTable;
 extern const CMPIContextFT contextTable;
 extern const CMPIEnumerationFT enumerationTable;
 extern const CMPIErrorFT errorTable;
+extern const CMPISelectExpFT selectExpTable;
 
 /** Immutable, so objects of one arena share it. */
 class StringObject final : public Object<CMPIString, Kind::string> {
@@ -288,6 +295,24 @@ class ErrorObject final : public Object<CMPIError, Kind::error> {
     friend class Arena;
 
     explicit ErrorObject(Arena& arena) : Object(&arena, errorTable) {}
+};
+
+/** Immutable. */
+class SelectExpObject final : public Object<CMPISelectExp, Kind::selectExp> {
+  public:
+    static SelectExpObject* make(Arena& arena, const BrokerState& broker,
+                                 std::shared_ptr<const filter::Filter> filter);
+
+    SelectExpObject* copyTo(Arena& target) const;
+
+    const BrokerState* broker;
+    const filter::Filter* filter; ///< kept by the arena
+
+  private:
+    friend class Arena;
+
+    SelectExpObject(Arena& arena, const BrokerState& brokerState, const filter::Filter* kept)
+        : Object(&arena, selectExpTable), broker(&brokerState), filter(kept) {}
 };
 
 } // namespace marlo::broker

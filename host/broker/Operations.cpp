@@ -152,8 +152,8 @@ CMPIInstance* getInstance(CMPIStatus& status, BrokerState& broker, const CMPICon
     return &found->handle;
 }
 
-constexpr unsigned capabilities =
-    CMPI_MB_BasicRead | CMPI_MB_OSEncapsulationSupport | CMPI_MB_MemEnhancements | CMPI_MB_Extended_Error;
+constexpr unsigned capabilities = CMPI_MB_BasicRead | CMPI_MB_Indications | CMPI_MB_OSEncapsulationSupport |
+                                  CMPI_MB_MemEnhancements | CMPI_MB_Extended_Error;
 
 } // namespace
 

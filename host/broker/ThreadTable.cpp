@@ -3,8 +3,10 @@
  * The broker's threads and locks, on POSIX threads. Functions that answer int answer an errno value.
  */
 #include "host/broker/BrokerState.h"
+#include "host/broker/Threads.h"
 
 #include <cerrno>
+#include <condition_variable>
 #include <cstring>
 #include <ctime>
 #include <iostream>
@@ -25,9 +27,43 @@ pthread_t threadOf(void* thread) {
     return reinterpret_cast<pthread_t>(thread);
 }
 
+/** Never destroyed: detached threads may end after all static objects. */
+struct RunningThreads {
+    std::mutex mutex;
+    std::condition_variable allEnded;
+    std::size_t count = 0;
+
+    static RunningThreads& get() {
+        static RunningThreads& threads = *std::make_unique<RunningThreads>().release();
+        return threads;
+    }
+};
+
+/** Counts a thread from before it starts until its function has ended. */
+class RunningThread {
+  public:
+    RunningThread() {
+        const std::lock_guard lock(RunningThreads::get().mutex);
+        ++RunningThreads::get().count;
+    }
+
+    ~RunningThread() {
+        const std::lock_guard lock(RunningThreads::get().mutex);
+        if (--RunningThreads::get().count == 0) {
+            RunningThreads::get().allEnded.notify_all();
+        }
+    }
+
+    RunningThread(const RunningThread&) = delete;
+    RunningThread& operator=(const RunningThread&) = delete;
+};
+
 struct Start {
+    Start(CMPIThreadFunc begin, void* given) : function(begin), argument(given) {}
+
     CMPIThreadFunc function;
     void* argument;
+    RunningThread running;
 };
 
 /**
@@ -58,7 +94,7 @@ void* newThread(CMPIThreadFunc function, void* argument, int detached) {
         return nullptr;
     }
     pthread_attr_setdetachstate(&attributes, detached != 0 ? PTHREAD_CREATE_DETACHED : PTHREAD_CREATE_JOINABLE);
-    auto start = std::make_unique<Start>(Start{function, argument});
+    auto start = std::make_unique<Start>(function, argument);
     pthread_t thread{};
     const int code = pthread_create(&thread, &attributes, runThread, start.get());
     pthread_attr_destroy(&attributes);
@@ -192,5 +228,11 @@ const CMPIBrokerExtFT threadTable = {
     newMutex,     destroyMutex,    lockMutex,       unlockMutex,      newCondition,      destroyCondition,
     condWait,     timedCondWait,   signalCondition,
 };
+
+bool waitForThreads(std::chrono::milliseconds longest) {
+    RunningThreads& threads = RunningThreads::get();
+    std::unique_lock lock(threads.mutex);
+    return threads.allEnded.wait_for(lock, longest, [&threads] { return threads.count == 0; });
+}
 
 } // namespace marlo::broker

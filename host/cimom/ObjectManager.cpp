@@ -1,16 +1,21 @@
 #include "host/cimom/ObjectManager.h"
 
 #include "host/broker/Broker.h"
+#include "host/broker/Threads.h"
 #include "host/cimom/AgentLog.h"
 #include "host/cimom/ChangeChecks.h"
 #include "host/cimom/ClassChecks.h"
 #include "host/cimom/InstanceChecks.h"
+#include "host/cimom/LogGate.h"
 #include "host/cimom/Provider.h"
 #include "host/cimom/ProviderCall.h"
 #include "host/cimom/SchemaKnowledge.h"
+#include "host/cimom/Subscriptions.h"
 
 #include <algorithm>
+#include <atomic>
 #include <iostream>
+#include <mutex>
 #include <utility>
 
 #include <pwd.h>
@@ -22,6 +27,9 @@ namespace {
 
 /** Operations that providers ask each other for in a circle end here, long before the stack does. */
 constexpr int deepestUpCall = 16;
+
+/** A thread that delivers an event takes milliseconds; one that hangs shall not hang the end of the process. */
+constexpr std::chrono::seconds longestWaitForThreads(2);
 
 thread_local int depth = 0;
 
@@ -82,16 +90,22 @@ struct ObjectManager::State final : broker::UpCalls {
         : schema(Schema::readDirectory(options.schemaDirectory)),
           knowledge(schema),
           principal(principalName()),
-          log(options.log ? options.log : writeToStandardError),
+          gate(options.log ? options.log : writeToStandardError),
+          log([this](const std::string& line) { gate.write(line); }),
           onceLog(log),
-          broker(knowledge, this, brokerLog(log, options.trace)) {
+          broker(knowledge, this, brokerLog(log, options.trace)),
+          subscriptions(schema, knowledge, broker, providers, principal, onceLog) {
         for (Registration& registration :
              readRegistrations(options.providerDirectory, options.libraryDirectory, schema)) {
             providers.push_back(std::make_unique<Provider>(std::move(registration), broker.handle()));
         }
     }
 
-    ~State() override;
+    /** Ends all that providers were asked for; up-calls are refused from now on. */
+    void end();
+
+    /** True when threads that nobody can wait for may still use this. */
+    [[nodiscard]] bool mayBeUsed() const;
 
     /** A provider and the class that it is to be asked for. */
     struct Service {
@@ -108,6 +122,10 @@ struct ObjectManager::State final : broker::UpCalls {
     /** Runs an operation: what is refused and what the agent logs goes into its status. */
     template <typename Operation>
     static Status run(const Operation& operation);
+
+    /** The same for what a provider asks for. */
+    template <typename Operation>
+    broker::Outcome runUpCall(const Operation& operation) const;
 
     Status enumerate(const std::string& nameSpace, const std::string& className, const PropertyList& properties,
                      const InstanceSink& sink);
@@ -128,18 +146,30 @@ struct ObjectManager::State final : broker::UpCalls {
     Schema schema;
     SchemaKnowledge knowledge;
     std::string principal;
+    LogGate gate;
     std::function<void(const std::string&)> log;
     OnceLog onceLog;
     broker::Broker broker;
     std::vector<std::unique_ptr<Provider>> providers;
+    Subscriptions subscriptions;
+    std::atomic<bool> ended{false};
 };
 
-ObjectManager::State::~State() {
+void ObjectManager::State::end() {
+    subscriptions.end();
+    broker::waitForThreads(longestWaitForThreads);
+    ended = true;
     const broker::CallScope scope;
     const CMPIContext* context = broker.newContext();
     for (const auto& provider : providers) {
         provider->cleanUp(*context);
     }
+    gate.close();
+}
+
+bool ObjectManager::State::mayBeUsed() const {
+    return std::any_of(providers.begin(), providers.end(),
+                       [](const auto& provider) { return provider->hasIndicationMI(); });
 }
 
 std::vector<ObjectManager::State::Service> ObjectManager::State::servicesOf(const std::string& nameSpace,
@@ -185,6 +215,15 @@ Status ObjectManager::State::run(const Operation& operation) {
         status.message = reasonOf(status.reported);
     }
     return status;
+}
+
+template <typename Operation>
+broker::Outcome ObjectManager::State::runUpCall(const Operation& operation) const {
+    if (ended) {
+        return {CMPI_RC_ERR_FAILED, "the object manager has ended"};
+    }
+    const Status status = run(operation);
+    return {status.code, status.message};
 }
 
 Status ObjectManager::State::enumerate(const std::string& nameSpace, const std::string& className,
@@ -305,30 +344,41 @@ Status ObjectManager::State::invoke(const ObjectPath& path, const std::string& n
 
 broker::Outcome ObjectManager::State::enumerateInstances(const ObjectPath& classPath, const PropertyNames& properties,
                                                          const UpCalls::InstanceSink& sink) {
-    const Status status = run([&] { return enumerate(classPath.nameSpace, classPath.className, properties, sink); });
-    return {status.code, status.message};
+    return runUpCall([&] { return enumerate(classPath.nameSpace, classPath.className, properties, sink); });
 }
 
 broker::Outcome ObjectManager::State::enumerateInstanceNames(const ObjectPath& classPath,
                                                              const UpCalls::PathSink& sink) {
-    const Status status = run([&] { return enumerateNames(classPath.nameSpace, classPath.className, sink); });
-    return {status.code, status.message};
+    return runUpCall([&] { return enumerateNames(classPath.nameSpace, classPath.className, sink); });
 }
 
 broker::Outcome ObjectManager::State::getInstance(const ObjectPath& path, const PropertyNames& properties,
                                                   const UpCalls::InstanceSink& sink) {
-    const Status status = run([&] { return get(path, properties, sink); });
-    return {status.code, status.message};
+    return runUpCall([&] { return get(path, properties, sink); });
 }
 
-/** Nobody can subscribe to indications here. */
-broker::Outcome ObjectManager::State::deliverIndication(const std::string& /*nameSpace*/, Instance&& /*indication*/) {
-    return {CMPI_RC_ERR_NOT_SUPPORTED, "indications are not delivered by this object manager"};
+broker::Outcome ObjectManager::State::deliverIndication(const std::string& nameSpace, Instance&& indication) {
+    return subscriptions.deliver(nameSpace, std::move(indication));
+}
+
+/** Never destroyed: threads may outlive all static objects. */
+template <typename Thing>
+void keepForGood(std::unique_ptr<Thing> thing) {
+    static std::mutex& mutex = *std::make_unique<std::mutex>().release();
+    static auto& kept = *std::make_unique<std::vector<std::unique_ptr<Thing>>>().release();
+    const std::lock_guard lock(mutex);
+    kept.push_back(std::move(thing));
 }
 
 ObjectManager::ObjectManager(const ObjectManagerOptions& options) : _state(std::make_unique<State>(options)) {}
 
-ObjectManager::~ObjectManager() = default;
+ObjectManager::~ObjectManager() {
+    const bool keep = _state->mayBeUsed();
+    _state->end();
+    if (keep) {
+        keepForGood(std::move(_state));
+    }
+}
 
 Status ObjectManager::enumerateInstances(const std::string& nameSpace, const std::string& className,
                                          const PropertyList& properties, const InstanceSink& sink) {
@@ -351,6 +401,16 @@ Status ObjectManager::modifyInstance(const Instance& modified, const PropertyLis
 Status ObjectManager::invokeMethod(const ObjectPath& path, const std::string& method,
                                    const std::vector<NamedValue>& arguments, MethodAnswer& answer) {
     return State::run([&] { return _state->invoke(path, method, arguments, answer); });
+}
+
+Status ObjectManager::subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
+                                const IndicationSink& sink, SubscriptionId& id) {
+    id = 0;
+    return State::run([&] { return _state->subscriptions.subscribe(nameSpace, filter, language, sink, id); });
+}
+
+Status ObjectManager::unsubscribe(SubscriptionId id) {
+    return State::run([&] { return _state->subscriptions.unsubscribe(id); });
 }
 
 const Schema& ObjectManager::schema() const {

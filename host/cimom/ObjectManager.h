@@ -7,6 +7,7 @@
 #include "host/model/Instance.h"
 #include "host/schema/Schema.h"
 
+#include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -37,6 +38,9 @@ struct MethodAnswer {
     std::vector<NamedValue> out;
 };
 
+/** Tells a subscription from every other one of its object manager; 0 is none. */
+using SubscriptionId = std::uint64_t;
+
 struct ObjectManagerOptions {
     std::string schemaDirectory;   ///< *.mof
     std::string providerDirectory; ///< *.toml, a registration file per provider library
@@ -50,6 +54,10 @@ struct ObjectManagerOptions {
 /**
  * One object manager. Operations may be called from any thread, concurrently. What providers throw is answered
  * CMPI_RC_ERR_FAILED with its text. Providers are loaded at the first request for one of their classes.
+ *
+ * Its end ends all subscriptions and waits, for a short while, until no thread of a provider runs that the broker has
+ * started. Threads that run on, and agents' own, find everything in place and are refused: what a provider of
+ * indications may still use is kept for the rest of the process.
  */
 class ObjectManager {
   public:
@@ -93,6 +101,28 @@ class ObjectManager {
      */
     Status invokeMethod(const ObjectPath& path, const std::string& method, const std::vector<NamedValue>& arguments,
                         MethodAnswer& answer);
+
+    /** Receives an indication on the thread that delivers it; several at once when several deliver. */
+    using IndicationSink = std::function<void(Instance&& indication)>;
+
+    /**
+     * Subscribes to the indications of a filter (host/filter/Filter.h) in "WQL" or "CQL" and gives the subscription's
+     * number, or 0 with the reason: a filter that is refused, with line and column (CMPI_RC_ERR_INVALID_QUERY and the
+     * like), a class that is none of indications, no provider, or a provider that refuses. What was told to providers
+     * before one of them refused is taken back.
+     *
+     * Each indication reaches the sink once, in its deliverer's order, without keys and with the selected properties
+     * that are of its class; the first one may do so before this returns. What a sink throws is the deliverer's
+     * failure. It may unsubscribe, but not while its provider is being told of a subscription on its own thread.
+     */
+    Status subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
+                     const IndicationSink& sink, SubscriptionId& id);
+
+    /**
+     * Ends a subscription whatever its providers answer; the first failure is answered. The sink is not called any
+     * more once this has returned, but for one that this was called from.
+     */
+    Status unsubscribe(SubscriptionId id);
 
     [[nodiscard]] const Schema& schema() const;
 

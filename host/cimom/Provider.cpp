@@ -120,8 +120,22 @@ CMPIMethodMI& Provider::methodMI(const CMPIContext& context) {
     return *_methodMI;
 }
 
+CMPIIndicationMI& Provider::indicationMI(const CMPIContext& context) {
+    const std::lock_guard lock(_mutex);
+    if (_indicationMI == nullptr) {
+        _indicationMI = static_cast<CMPIIndicationMI*>(make(_registration.name + "_Create_IndicationMI", context));
+    }
+    return *_indicationMI;
+}
+
+bool Provider::hasIndicationMI() {
+    const std::lock_guard lock(_mutex);
+    return _indicationMI != nullptr;
+}
+
 void Provider::cleanUp(const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
+    tellEnd(_indicationMI, context);
     tellEnd(_instanceMI, context);
     tellEnd(_methodMI, context);
 }

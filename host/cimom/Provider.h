@@ -40,6 +40,12 @@ class Provider {
     /** The method interface; the same. */
     CMPIMethodMI& methodMI(const CMPIContext& context);
 
+    /** The indication interface; the same. */
+    CMPIIndicationMI& indicationMI(const CMPIContext& context);
+
+    /** True once there is an indication interface: from then on the provider may use the broker at any time. */
+    [[nodiscard]] bool hasIndicationMI();
+
     /** Tells the interfaces that were made that the process ends. Calls no provider that was never used. */
     void cleanUp(const CMPIContext& context);
 
@@ -53,6 +59,7 @@ class Provider {
     void* _library = nullptr;
     CMPIInstanceMI* _instanceMI = nullptr;
     CMPIMethodMI* _methodMI = nullptr;
+    CMPIIndicationMI* _indicationMI = nullptr;
 };
 
 /** The text of the exception that is being handled, of whatever type it is. */

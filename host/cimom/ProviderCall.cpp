@@ -1,6 +1,6 @@
 #include "host/cimom/ProviderCall.h"
 
-#include "host/cimom/StatusCodes.h"
+#include "host/cimom/CallContext.h"
 
 #include <optional>
 #include <utility>
@@ -55,28 +55,11 @@ struct ProviderCall::Arguments {
     const char** properties; ///< null asks for all
 };
 
-Status ProviderCall::statusOf(const CMPIStatus& answered) const {
-    if (answered.rc == CMPI_RC_OK) {
-        return {};
-    }
-    const std::string& name = _provider.registration().name;
-    std::string message = broker::messageOf(answered);
-    if (message.empty()) {
-        message = "provider " + name + " gave no reason";
-    }
-    if (isCimStatus(answered.rc)) {
-        return {answered.rc, std::move(message), {}};
-    }
-    return {CMPI_RC_ERR_FAILED, message + " (CMPI return code " + std::to_string(answered.rc) + ")", {}};
-}
-
 Status ProviderCall::call(const ObjectPath& path, const PropertyList& properties, broker::ResultSink& sink,
                           const Function& function, bool* isDone) {
     const broker::CallScope scope;
-    CMPIContext* context = _broker.newContext();
-    _broker.addEntry(context, CMPIInvocationFlags, Value::uint(CMPI_uint32, 0));
-    _broker.addEntry(context, CMPIPrincipal, Value::string(_principal));
-    _broker.addEntry(context, CMPIInitNameSpace, Value::string(path.nameSpace));
+    const std::string& provider = _provider.registration().name;
+    CMPIContext* context = newCallContext(_broker, _principal, path.nameSpace);
     std::vector<const char*> names;
     if (properties) {
         for (const std::string& name : *properties) {
@@ -89,13 +72,11 @@ Status ProviderCall::call(const ObjectPath& path, const PropertyList& properties
                               properties ? names.data() : nullptr};
     Status status;
     try {
-        status = statusOf(function(arguments));
+        status = statusOf(function(arguments), provider);
     } catch (const LoadError& error) {
         status = {CMPI_RC_ERR_FAILED, error.what(), {}};
     } catch (...) {
-        status = {CMPI_RC_ERR_FAILED,
-                  "provider " + _provider.registration().name + " threw: " + currentExceptionText(),
-                  {}};
+        status = statusOfException(provider);
     }
     result.rethrow();
     if (isDone != nullptr) {

@@ -46,7 +46,6 @@ class ProviderCall {
 
     Status call(const ObjectPath& path, const PropertyList& properties, broker::ResultSink& sink,
                 const Function& function, bool* isDone = nullptr);
-    Status statusOf(const CMPIStatus& answered) const;
 
     const broker::Broker& _broker;
     Provider& _provider;
