@@ -80,11 +80,6 @@ TEST_F(Services, HandLogAndTraceLinesToTheLog) {
     EXPECT_EQ(log[1].component + "/" + log[1].text, "component/string");
 }
 
-TEST_F(Services, MakeNoSelectExpressions) {
-    EXPECT_EQ(CMNewSelectExp(mb, "SELECT * FROM Thing", "WQL", nullptr, &status), nullptr);
-    EXPECT_EQ(status.rc, CMPI_RC_ERR_NOT_SUPPORTED);
-}
-
 /** Remembers what it is given; throws at paths. */
 struct RecordingSink final : broker::ResultSink {
     void instance(const CMPIInstance& instance) override {

@@ -88,6 +88,7 @@ TEST(Tables, OfEncapsulatedObjectsHaveNoNullSlot) {
                      "error");
     expectWholeTable(mb->bft->enumerateInstances(mb, context, path, nullptr, nullptr), "enumeration");
     expectWholeTable(result.handle(), "result");
+    expectWholeTable(mb->eft->newSelectExp(mb, "SELECT * FROM Thing", "WQL", nullptr, nullptr), "select expression");
 }
 
 } // namespace
