@@ -287,7 +287,8 @@ broker::Outcome Subscriptions::deliver(const std::string& nameSpace, Instance&& 
     if (!checked) {
         return outcome;
     }
-    for (const auto& [id, entry] : *list()) {
+    const auto subscribed = list(); // held, as others may unsubscribe meanwhile
+    for (const auto& [id, entry] : *subscribed) {
         try {
             if (entry->wants(*checked, _knowledge)) {
                 entry->deliver(*checked);
