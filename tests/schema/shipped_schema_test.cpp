@@ -80,6 +80,25 @@ const std::map<std::string, CMPIType> PortTypes = {{"CreationClassName", CMPI_st
                                                    {"AutoSense", CMPI_boolean},
                                                    {"LinkTechnology", CMPI_uint16}};
 
+const std::map<std::string, CMPIType> EventTypes = {{"IndicationIdentifier", CMPI_string},
+                                                    {"EventID", CMPI_string},
+                                                    {"IndicationTime", CMPI_dateTime},
+                                                    {"EventTime", CMPI_dateTime},
+                                                    {"AlertingManagedElement", CMPI_string},
+                                                    {"CorrelatedIndications", CMPI_stringA},
+                                                    {"PerceivedSeverity", CMPI_uint16},
+                                                    {"Description", CMPI_string},
+                                                    {"Message", CMPI_string},
+                                                    {"MessageID", CMPI_string},
+                                                    {"AlertingElementFormat", CMPI_uint16},
+                                                    {"AlertType", CMPI_uint16},
+                                                    {"ProbableCause", CMPI_uint16},
+                                                    {"SystemCreationClassName", CMPI_string},
+                                                    {"SystemName", CMPI_string},
+                                                    {"UniqueSystemID", CMPI_string},
+                                                    {"OwningEntity", CMPI_string},
+                                                    {"ProviderName", CMPI_string}};
+
 TEST_F(ShippedSchema, HasItsTwoNamespaces) {
     EXPECT_THAT(schema().nameSpaces(), ElementsAre("root/tavis", "root/quarn"));
 }
@@ -127,18 +146,34 @@ TEST_F(ShippedSchema, GivesThePlatformsClassesWhatIsReadOfThem) {
     EXPECT_THAT(keysOf(port), ElementsAre("SystemCreationClassName", "SystemName", "CreationClassName", "DeviceID"));
 }
 
+TEST_F(ShippedSchema, GivesTheIndicationsWhatTheProviderSetsOfThem) {
+    for (const char* name : {"MARLO_NetworkAdapterOnlineEvent", "MARLO_NetworkAdapterOfflineEvent",
+                             "MARLO_NetworkAdapterSwitchOverEvent", "MARLO_NetworkAdapterSwitchBackEvent"}) {
+        const Class& event = find("root/tavis", name);
+        expectTypes(event, EventTypes);
+        EXPECT_EQ(event.properties.size(), EventTypes.size()) << name;
+        EXPECT_TRUE(event.isIndication) << name;
+        EXPECT_FALSE(event.isAbstract) << name;
+        EXPECT_TRUE(schema().isA("root/tavis", name, "CIM_AlertIndication")) << name;
+        EXPECT_TRUE(schema().isA("root/tavis", name, "CIM_ProcessIndication")) << name;
+        EXPECT_TRUE(event.keys().empty()) << name;
+    }
+    EXPECT_EQ(schema().findClass("root/quarn", "MARLO_NetworkAdapterOnlineEvent"), nullptr);
+}
+
 TEST_F(ShippedSchema, KeepsTheNamespacesApart) {
     EXPECT_EQ(schema().findClass("root/quarn", "MARLO_PhysicalNetworkAdapter"), nullptr);
     EXPECT_EQ(schema().findClass("root/tavis", "TAVIS_NetworkCard"), nullptr);
 }
 
-TEST_F(ShippedSchema, DerivesEverythingFromTheStandardsRootAndServesNoAbstractClass) {
+TEST_F(ShippedSchema, DerivesEverythingFromTheStandardsRootsAndServesNoAbstractClass) {
     for (const std::string& nameSpace : schema().nameSpaces()) {
         for (const Class* each : schema().classes(nameSpace)) {
-            EXPECT_TRUE(schema().isA(nameSpace, each->name, "CIM_ManagedElement")) << each->name;
+            const char* const root = each->isIndication ? "CIM_Indication" : "CIM_ManagedElement";
+            EXPECT_TRUE(schema().isA(nameSpace, each->name, root)) << each->name;
             const bool isOurs = !each->name.starts_with("CIM_");
             EXPECT_FALSE(isOurs && each->isAbstract) << each->name;
-            EXPECT_FALSE(isOurs && each->keys().empty()) << each->name;
+            EXPECT_FALSE(isOurs && each->keys().empty() != each->isIndication) << each->name;
         }
     }
 }
