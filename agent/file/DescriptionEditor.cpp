@@ -1,5 +1,6 @@
 #include "agent/file/DescriptionEditor.h"
 
+#include "agent/config/TextEdit.h"
 #include "agent/config/TomlReader.h"
 
 #include <algorithm>
@@ -13,13 +14,6 @@ namespace Orv::Agent {
 namespace {
 
 constexpr std::string_view byteOrderMark = "\xEF\xBB\xBF";
-
-/** A piece of the text and what stands there instead. */
-struct Splice {
-    std::size_t begin;
-    std::size_t end;
-    std::string text;
-};
 
 struct Range {
     std::size_t begin;
@@ -83,7 +77,7 @@ class TableEditor {
                 editKey(edit);
             }
         }
-        return spliced();
+        return _edit.applied(_text);
     }
 
   private:
@@ -105,7 +99,7 @@ class TableEditor {
         const auto entry = std::find_if(_entries.begin(), _entries.end(),
                                         [&](const Entry& candidate) { return candidate.key == edit.key; });
         if (entry != _entries.end() && edit.value) {
-            _splices.push_back({entry->value.begin, entry->value.end, *edit.value});
+            _edit.replace(entry->value.begin, entry->value.end, *edit.value);
         } else if (entry != _entries.end()) {
             remove(*entry);
         } else if (edit.value) {
@@ -118,7 +112,7 @@ class TableEditor {
         const std::size_t end = lineEnd(entry.value.end);
         const bool hasComment = piece({entry.value.end, end}).find('#') != std::string_view::npos;
         const std::size_t comment = _text.find('#', entry.value.end);
-        _splices.push_back({hasComment ? entry.keyRange.begin : begin, hasComment ? comment : end, {}});
+        _edit.replace(hasComment ? entry.keyRange.begin : begin, hasComment ? comment : end, {});
     }
 
     /** Behind the last key's line, with the blanks in front that this line has. */
@@ -128,8 +122,7 @@ class TableEditor {
         const std::size_t place = lineEnd(last.end);
         const bool hasEnd = place > 0 && _text[place - 1] == '\n';
         const std::string newline = _text.find("\r\n") != std::string_view::npos ? "\r\n" : "\n";
-        _splices.push_back(
-            {place, place, (hasEnd ? "" : newline) + std::string(piece({begin, last.begin})) + assignment + newline});
+        _edit.insert(place, (hasEnd ? "" : newline) + std::string(piece({begin, last.begin})) + assignment + newline);
     }
 
     [[nodiscard]] Range lastEntry() const { return {_entries.back().keyRange.begin, _entries.back().value.end}; }
@@ -154,27 +147,14 @@ class TableEditor {
             text += (text.empty() ? "{ " : ", ") + assignment;
         }
         const Range whole = _places.of(_table.source());
-        _splices.push_back({whole.begin, whole.end, text.empty() ? "{}" : text + " }"});
-    }
-
-    std::string spliced() {
-        std::stable_sort(_splices.begin(), _splices.end(),
-                         [](const Splice& left, const Splice& right) { return left.begin < right.begin; });
-        std::string text;
-        std::size_t done = 0;
-        for (const Splice& splice : _splices) {
-            text += piece({done, splice.begin});
-            text += splice.text;
-            done = splice.end;
-        }
-        return text.append(_text.substr(done));
+        _edit.replace(whole.begin, whole.end, text.empty() ? "{}" : text + " }");
     }
 
     std::string_view _text;
     Places _places;
     const toml::table& _table;
     std::vector<Entry> _entries; ///< in the order of the text
-    std::vector<Splice> _splices;
+    TextEdit _edit;
 };
 
 } // namespace

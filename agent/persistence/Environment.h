@@ -18,9 +18,11 @@ enum class ManagerChoice { automatic, ifupdown, networkd, none };
 struct Commands {
     std::vector<std::string> ifup{"/sbin/ifup"};
     std::vector<std::string> dhclient{"/sbin/dhclient"};
+    std::vector<std::string> udhcpc{"/sbin/udhcpc"};
     std::vector<std::string> dhcpcd{"/sbin/dhcpcd"};
     std::vector<std::string> resolvconf{"/sbin/resolvconf"};
-    std::chrono::milliseconds patience{std::chrono::seconds(60)}; ///< for one command, DHCP's own waiting included
+    std::chrono::milliseconds patience{
+        std::chrono::seconds(90)}; ///< for one command; a DHCP client tries for 60 itself
 };
 
 struct Environment {

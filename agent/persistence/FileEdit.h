@@ -23,4 +23,7 @@ struct FileEdit {
 
 using FileEdits = std::vector<FileEdit>;
 
+/** The whole content of a file; none when there is no such file. Throws std::system_error when it cannot be read. */
+std::optional<std::string> contentOf(const std::string& path);
+
 } // namespace Orv::Agent::Persistence

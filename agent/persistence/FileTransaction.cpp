@@ -47,17 +47,6 @@ std::string directoryOf(const std::string& path) {
     return directory.empty() ? "." : directory;
 }
 
-std::optional<std::string> contentOf(const std::string& path) {
-    try {
-        return readTextFile(path).text;
-    } catch (const std::system_error& error) {
-        if (error.code() == std::errc::no_such_file_or_directory) {
-            return std::nullopt;
-        }
-        throw;
-    }
-}
-
 void requireContent(const std::string& path, const std::optional<std::string>& expected) {
     if (contentOf(path) != expected) {
         throw std::runtime_error(path + ": has been changed by somebody else meanwhile");
@@ -221,6 +210,17 @@ FileEdit opposite(const FileEdit& edit) {
 }
 
 } // namespace
+
+std::optional<std::string> contentOf(const std::string& path) {
+    try {
+        return readTextFile(path).text;
+    } catch (const std::system_error& error) {
+        if (error.code() == std::errc::no_such_file_or_directory) {
+            return std::nullopt;
+        }
+        throw;
+    }
+}
 
 FileTransaction::~FileTransaction() {
     try {

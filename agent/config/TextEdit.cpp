@@ -1,0 +1,21 @@
+#include "agent/config/TextEdit.h"
+
+#include <algorithm>
+
+namespace Orv::Agent {
+
+std::string TextEdit::applied(std::string_view text) const {
+    std::vector<Splice> ordered = _splices;
+    std::stable_sort(ordered.begin(), ordered.end(),
+                     [](const Splice& left, const Splice& right) { return left.begin < right.begin; });
+    std::string result;
+    std::size_t done = 0;
+    for (const Splice& splice : ordered) {
+        result += text.substr(done, splice.begin - done);
+        result += splice.text;
+        done = splice.end;
+    }
+    return result.append(text.substr(done));
+}
+
+} // namespace Orv::Agent
