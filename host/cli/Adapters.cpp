@@ -150,27 +150,10 @@ Style styleOf(const std::string& property, const Value& value) {
     return *text == "Stopped" || *text == "IP disabled" ? Style::Faint : Style::Bad;
 }
 
-std::string showInTable(const Value& value) {
-    if (const auto* const truth = std::get_if<bool>(&value.data)) {
-        return *truth ? "yes" : "no";
-    }
-    return showPlainly(value);
-}
-
 Cell makeCell(const Instance& adapter, const std::string& property) {
-    Cell cell;
-    if (const NamedValue* const found = findName(adapter.properties, property)) {
-        cell.style = styleOf(property, found->value);
-        const Value::Array single = {found->value};
-        const auto* const array = std::get_if<Value::Array>(&found->value.data);
-        for (const Value& element : array == nullptr ? single : *array) {
-            const std::string text = element.isNull() ? std::string() : showInTable(element);
-            if (!text.empty()) {
-                cell.lines.push_back(text);
-            }
-        }
-    }
-    return cell.lines.empty() ? Cell{{"-"}, Style::Plain} : cell;
+    const NamedValue* const found = findName(adapter.properties, property);
+    const Value value = found == nullptr ? Value{} : found->value;
+    return {showInCell(value), styleOf(property, value)};
 }
 
 std::string titleOf(const std::string& property) {
@@ -208,12 +191,13 @@ ExitCode printJson(AdapterList& adapters, const Schema& schema, const std::vecto
                    Output& output) {
     JsonArray array(output);
     const ExitCode code = adapters.read([&](Instance&& adapter) {
-        orderBySchema(schema, adapter);
         if (!chosen.empty()) {
             std::erase_if(adapter.properties, [&chosen](const NamedValue& property) {
                 return std::find(chosen.begin(), chosen.end(), property.name) == chosen.end();
             });
+            addMissing(schema, adapter, chosen);
         }
+        orderBySchema(schema, adapter);
         array.add(toJson(adapter));
     });
     array.close(adapters.answered());

@@ -1,6 +1,7 @@
 #include "host/cli/Commands.h"
 
 #include "host/cli/Adapters.h"
+#include "host/cli/Changes.h"
 #include "host/cli/Json.h"
 #include "host/cli/Table.h"
 #include "host/cli/Text.h"
@@ -19,10 +20,11 @@ PropertyList propertyList(const Options& options) {
 /** Prints instances as they come: in JSON, or as paragraphs. */
 class InstancePrinter {
   public:
-    InstancePrinter(const Schema& schema, bool json, Output& output)
-        : _schema(schema), _json(json), _output(output), _array(output) {}
+    InstancePrinter(const Schema& schema, const Options& options, Output& output)
+        : _schema(schema), _properties(options.properties), _json(options.json), _output(output), _array(output) {}
 
     void operator()(Instance&& instance) {
+        addMissing(_schema, instance, _properties);
         orderBySchema(_schema, instance);
         if (_json) {
             _array.add(toJson(instance));
@@ -43,6 +45,7 @@ class InstancePrinter {
 
   private:
     const Schema& _schema;
+    const std::vector<std::string>& _properties;
     bool _json;
     Output& _output;
     JsonArray _array;
@@ -57,7 +60,7 @@ void hintThatNothingIsThere(bool isEmpty, const Status& status, const Options& o
 
 ExitCode runEnumerate(ObjectManager& manager, const Options& options, Output& output) {
     requireProperties(manager.schema(), options.nameSpace, options.argument, options.properties);
-    InstancePrinter print(manager.schema(), options.json, output);
+    InstancePrinter print(manager.schema(), options, output);
     const Status status = manager.enumerateInstances(options.nameSpace, options.argument, propertyList(options),
                                                      [&print](Instance&& instance) { print(std::move(instance)); });
     print.close(status.ok());
@@ -100,7 +103,7 @@ ObjectPath parsePath(const Options& options) {
 ExitCode runGet(ObjectManager& manager, const Options& options, Output& output) {
     const ObjectPath path = parsePath(options);
     requireProperties(manager.schema(), path.nameSpace, path.className, options.properties);
-    InstancePrinter print(manager.schema(), options.json, output);
+    InstancePrinter print(manager.schema(), options, output);
     const Status status = manager.getInstance(path, propertyList(options),
                                               [&print](Instance&& instance) { print(std::move(instance)); });
     print.close(status.ok());
@@ -170,6 +173,16 @@ void requireProperties(const Schema& schema, const std::string& nameSpace, const
     }
 }
 
+void addMissing(const Schema& schema, Instance& instance, const std::vector<std::string>& names) {
+    const Class* const definition = schema.findClass(instance.path.nameSpace, instance.path.className);
+    for (const std::string& name : names) {
+        const Property* const property = definition == nullptr ? nullptr : definition->findProperty(name);
+        if (property != nullptr && findName(instance.properties, name) == nullptr) {
+            instance.properties.push_back({property->name, Value::null(property->type)});
+        }
+    }
+}
+
 void orderBySchema(const Schema& schema, Instance& instance) {
     const Class* const found = schema.findClass(instance.path.nameSpace, instance.path.className);
     if (found == nullptr) {
@@ -195,6 +208,14 @@ ExitCode run(ObjectManager& manager, const Options& options, Output& output) {
         return runNames(manager, options, output);
     case Command::Get:
         return runGet(manager, options, output);
+    case Command::Invoke:
+    case Command::Set:
+    case Command::Static:
+    case Command::Dhcp:
+    case Command::Dns:
+    case Command::Gateway:
+    case Command::Restart:
+        return runChange(manager, options, output);
     case Command::Classes:
         return runClasses(manager, options, output);
     case Command::Completion:

@@ -26,6 +26,9 @@ ExitCode report(const Status& status);
 void requireProperties(const Schema& schema, const std::string& nameSpace, const std::string& className,
                        const std::vector<std::string>& names);
 
+/** Adds those of the named properties that the instance's class has and the instance has not, as NULL. */
+void addMissing(const Schema& schema, Instance& instance, const std::vector<std::string>& names);
+
 /** Brings properties into the order of their class. */
 void orderBySchema(const Schema& schema, Instance& instance);
 

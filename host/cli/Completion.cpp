@@ -19,6 +19,30 @@ _marlo_classes() {
     "$command" classes --names -n "$namespace" 2>/dev/null
 }
 
+_marlo_adapters() {
+    local command="$1" tree=() i
+    for ((i = 1; i < COMP_CWORD; ++i)); do
+        [[ "${COMP_WORDS[i]}" != --tree ]] || tree=(--tree "${COMP_WORDS[i + 1]}")
+    done
+    "$command" names MARLO_NetworkAdapterConfiguration "${tree[@]}" 2>/dev/null |
+        sed -n 's/^.*\.SettingID="\(.*\)"$/\1/p'
+}
+
+# The arguments behind the command: how many there are before the word that is being typed, without options.
+_marlo_arguments() {
+    local i seen=0 count=0
+    for ((i = 1; i < COMP_CWORD; ++i)); do
+        case "${COMP_WORDS[i]}" in
+        "$1") seen=1 ;;
+        -n | --namespace | --tree | --agent-config | --schema | --providers | --libraries | --*-level | --*-sink) ((++i)) ;;
+        --mask | --gateway | --server | --search | --domain | -p | --property) ((++i)) ;;
+        -*) ;;
+        *) ((count += seen)) ;;
+        esac
+    done
+    echo "$count"
+}
+
 _marlo() {
     local current="${COMP_WORDS[COMP_CWORD]}" previous="${COMP_WORDS[COMP_CWORD - 1]}"
     local commands options subcommand="" i
@@ -58,6 +82,21 @@ constexpr const char* ScriptTail = R"bash(
     get)
         mapfile -t COMPREPLY < <(compgen -S . -W "$(_marlo_classes "${COMP_WORDS[0]}")" -- "$current")
         compopt -o nospace
+        ;;
+    invoke | set | static | dhcp | dns | gateway)
+        case "$subcommand $(_marlo_arguments "$subcommand")" in
+        *" 0")
+            mapfile -t COMPREPLY < <(compgen -W "$(_marlo_adapters "${COMP_WORDS[0]}")" -- "$current")
+            ;;
+        "invoke 1")
+            mapfile -t COMPREPLY < <(compgen -W "EnableDHCP EnableStatic SetGateways SetDNSDomain \
+                SetDNSServerSearchOrder SetDNSSuffixSearchOrder RestartNetwork" -- "$current")
+            ;;
+        "set "*)
+            mapfile -t COMPREPLY < <(compgen -S = -W "IPv4Address SubnetMask DefaultIPGateway DNSDomain" -- "$current")
+            compopt -o nospace
+            ;;
+        esac
         ;;
     completion)
         mapfile -t COMPREPLY < <(compgen -W "bash" -- "$current")

@@ -65,6 +65,21 @@ Json makeObject(const Instance& instance) {
             {"properties", makeJson(instance.properties)}};
 }
 
+Json makeCall(const Call& call) {
+    Json object = {{"call", call.name}};
+    if (!call.status.ok()) {
+        object["error"] = {
+            {"code", call.status.code}, {"name", statusName(call.status.code)}, {"message", call.status.message}};
+    } else if (!call.answer.returned.isNull()) {
+        object["returned"] = makeJson(call.answer.returned);
+        object["out"] = makeJson(call.answer.out);
+    }
+    if (!call.status.reported.empty()) {
+        object["reported"] = call.status.reported;
+    }
+    return object;
+}
+
 /** Bytes that are no UTF-8 become U+FFFD: JSON has no way to carry them. */
 std::string print(const Json& json) {
     return json.dump(-1, ' ', false, Json::error_handler_t::replace);
@@ -78,6 +93,21 @@ std::string toJson(const Instance& instance) {
 
 std::string toJson(const ObjectPath& path) {
     return print({{"path", path.toString()}, {"class", path.className}, {"keys", makeJson(path.keys)}});
+}
+
+std::string toJson(const ChangeReport& report) {
+    Json calls = Json::array();
+    for (const Call& call : report.calls) {
+        calls.push_back(makeCall(call));
+    }
+    Json changes = Json::array();
+    for (const Difference& difference : report.differences) {
+        changes.push_back({{"adapter", difference.adapter},
+                           {"property", difference.property},
+                           {"before", makeJson(difference.before)},
+                           {"after", makeJson(difference.after)}});
+    }
+    return print({{"calls", calls}, {"changes", changes}});
 }
 
 std::string toJson(const Class& schemaClass) {

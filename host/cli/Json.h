@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "host/cli/ChangeReport.h"
 #include "host/cli/Output.h"
 #include "host/model/Instance.h"
 #include "host/schema/Schema.h"
@@ -23,6 +24,14 @@ std::string toJson(const ObjectPath& path);
 
 /** `{"class": "...", "superclass": "..." or null, "abstract": bool, "keys": ["Name", ...]}` on one line. */
 std::string toJson(const Class& schemaClass);
+
+/**
+ * `{"calls": [...], "changes": [...]}` on one line. A call is `{"call": "...", "returned": value, "out": {...}}`,
+ * without the latter two for a modification, or `{"call": "...", "error": {"code": n, "name": "CIM_ERR_...",
+ * "message": "..."}}`; either may have `"reported": ["..."]` beside. A change is
+ * `{"adapter": "...", "property": "...", "before": value, "after": value}`.
+ */
+std::string toJson(const ChangeReport& report);
 
 /** A JSON array that is written element by element, and not at all when nothing is added and it is not closed. */
 class JsonArray {

@@ -17,7 +17,21 @@ class UsageError : public std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-enum class Command { Adapters, Enumerate, Names, Get, Classes, Completion };
+enum class Command {
+    Adapters,
+    Enumerate,
+    Names,
+    Get,
+    Invoke,
+    Set,
+    Static,
+    Dhcp,
+    Dns,
+    Gateway,
+    Restart,
+    Classes,
+    Completion
+};
 
 /** What is told to the agent library of this process, over its own configuration. */
 struct AgentOptions {
@@ -38,7 +52,15 @@ struct DirectoryOptions {
 
 struct Options {
     Command command = Command::Adapters;
-    std::string argument; ///< a class, a path or a shell
+    std::string argument; ///< a class, a path, an adapter or a shell
+    std::string method;
+    std::vector<std::string> values; ///< NAME=VALUE
+    std::string address;             ///< with or without a prefix length
+    std::string mask;
+    std::string gateway;
+    std::vector<std::string> servers;
+    std::vector<std::string> suffixes;
+    std::string domain;
     std::string nameSpace = "root/tavis";
     std::vector<std::string> properties; ///< none: all
     bool json = false;

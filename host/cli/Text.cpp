@@ -165,6 +165,22 @@ std::string showPlainly(const Value& value) {
     return std::visit(Show{false}, value.data);
 }
 
+std::vector<std::string> showInCell(const Value& value) {
+    std::vector<std::string> lines;
+    const Value::Array single = {value};
+    const auto* const array = std::get_if<Value::Array>(&value.data);
+    for (const Value& element : array == nullptr ? single : *array) {
+        const auto* const truth = std::get_if<bool>(&element.data);
+        const std::string text = element.isNull()   ? std::string()
+                                 : truth == nullptr ? showPlainly(element)
+                                                    : std::string(*truth ? "yes" : "no");
+        if (!text.empty()) {
+            lines.push_back(text);
+        }
+    }
+    return lines.empty() ? std::vector<std::string>{"-"} : lines;
+}
+
 std::string showInstance(const Instance& instance) {
     std::size_t width = 0;
     for (const NamedValue& property : instance.properties) {

@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace marlo::cli {
 
@@ -27,6 +28,9 @@ std::string showValue(const Value& value);
 
 /** A value without quotes, an element of an array as if alone: for tables. */
 std::string showPlainly(const Value& value);
+
+/** A value as the lines of a table's cell, an array's elements below each other; "-" for nothing. */
+std::vector<std::string> showInCell(const Value& value);
 
 /** The object path, then a line for each property, names and values aligned. */
 std::string showInstance(const Instance& instance);

@@ -65,6 +65,14 @@ TEST_F(MarloAdapters, AreJsonOfThePropertiesThatAreAskedFor) {
     EXPECT_EQ(json[0]["properties"], (nlohmann::json{{"Status", "OK"}}));
 }
 
+TEST_F(MarloAdapters, AreJsonWithNULLForWhatIsAskedForAndTheyLack) {
+    const auto json = marloJson({"adapters", "-p", "SettingID,dnsdomain,IPSubnet"});
+    EXPECT_EQ(json[0]["properties"].dump(),
+              R"({"SettingID":"bond0","IPSubnet":["255.255.255.0"],"DNSDomain":"lab.example.org"})");
+    EXPECT_EQ(json[1]["properties"]["DNSDomain"], nullptr);
+    EXPECT_TRUE(json[1]["properties"].contains("DNSDomain"));
+}
+
 TEST_F(MarloAdapters, TellWhetherTheyTakePartInIpWhereTheyHaveNoPort) {
     const std::string other = write("other.toml", "[[adapter]]\nidentity = \"up0\"\nip_support = 1\n"
                                                   "[[adapter]]\nidentity = \"down0\"\nip_support = 0\n"

@@ -66,6 +66,26 @@ TEST_F(MarloObjects, HaveOnlyThePropertiesThatAreAskedFor) {
     EXPECT_EQ(json[0]["path"], "root/tavis:MARLO_NetworkAdapterConfiguration.SettingID=\"bond0\"");
 }
 
+TEST_F(MarloObjects, ShowWhatIsAskedForAndMissingAsNULL) {
+    EXPECT_THAT(marlo({"get", EthPath, "-p", "dnsdomain,SettingID"}).out,
+                testing::EndsWith("\n  SettingID = \"eth0\"\n  DNSDomain = NULL\n"));
+    const auto json = marloJson({"enum", Configuration, "-p", "DNSDomain"});
+    EXPECT_EQ(json[0]["properties"], (nlohmann::json{{"DNSDomain", "lab.example.org"}}));
+    EXPECT_EQ(json[1]["properties"], (nlohmann::json{{"DNSDomain", nullptr}}));
+}
+
+TEST_F(MarloObjects, LackWhatOnlyADerivedClassHas) {
+    const auto json = marloJson({"enum", "CIM_ManagedElement", "-p", "DNSDomain,Caption"});
+    bool ofOtherClass = false;
+    for (const auto& instance : json) {
+        const bool isConfiguration = instance["class"] == Configuration;
+        EXPECT_EQ(instance["properties"].contains("DNSDomain"), isConfiguration);
+        EXPECT_TRUE(instance["properties"].contains("Caption"));
+        ofOtherClass = ofOtherClass || !isConfiguration;
+    }
+    EXPECT_TRUE(ofOtherClass);
+}
+
 TEST_F(MarloObjects, TakePropertyNamesInAnyCase) {
     const auto json = marloJson({"get", EthPath, "-p", "macaddress"});
     ASSERT_EQ(json.size(), 1U);

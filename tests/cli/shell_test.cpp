@@ -74,8 +74,25 @@ TEST_F(MarloShell, CompletesClassesOfTheNamespaceAndFiles) {
     EXPECT_THAT(complete("marlo adapters --tree ho"), ElementsAre("host.toml"));
 }
 
+TEST_F(MarloShell, CompletesAdaptersMethodsAndProperties) {
+    EXPECT_THAT(complete("marlo dhcp --tree host.toml ''"), ElementsAre("bond0", "eth0", "eth1", "eth2"));
+    EXPECT_THAT(complete("marlo static --tree host.toml eth"), ElementsAre("eth0", "eth1", "eth2"));
+    EXPECT_THAT(complete("marlo static eth0 --tree host.toml ''"), IsEmpty());
+    EXPECT_THAT(complete("marlo invoke eth0 Enable"), ElementsAre("EnableDHCP", "EnableStatic"));
+    EXPECT_THAT(complete("marlo set --tree host.toml eth0 D"), ElementsAre("DefaultIPGateway=", "DNSDomain="));
+    EXPECT_THAT(complete("marlo static eth0 --ga"), ElementsAre("--gateway"));
+}
+
+TEST_F(MarloShell, ShowsItsArgumentsByTheirNamesAlone) {
+    const std::string help = marlo({"enum", "--help"}).out;
+    EXPECT_THAT(help, HasSubstr("  CLASS REQUIRED "));
+    EXPECT_THAT(help, HasSubstr("  --schema DIR "));
+    EXPECT_THAT(marlo({"invoke", "--help"}).out, Not(HasSubstr("TEXT")));
+}
+
 TEST_F(MarloShell, ExplainsEveryCommandWithExamples) {
-    for (const char* command : {"adapters", "enum", "names", "get", "classes", "completion"}) {
+    for (const char* command : {"adapters", "enum", "names", "get", "invoke", "set", "static", "dhcp", "dns",
+                                "gateway", "restart", "classes", "completion"}) {
         const Outcome outcome = marlo({command, "--help"});
         EXPECT_EQ(outcome.exitCode, 0) << command;
         EXPECT_EQ(outcome.err, "") << command;
@@ -87,7 +104,8 @@ TEST_F(MarloShell, ExplainsEveryCommandWithExamples) {
 TEST_F(MarloShell, AnswersEveryExampleOfItsHelp) {
     const std::string bin = std::filesystem::path(MARLO_EXECUTABLE).parent_path();
     std::size_t examples = 0;
-    for (const char* command : {"", "adapters", "enum", "names", "get", "classes", "completion"}) {
+    for (const char* command : {"", "adapters", "enum", "names", "get", "invoke", "set", "static", "dhcp", "dns",
+                                "gateway", "classes", "completion"}) {
         const Outcome help = marlo(*command == '\0' ? std::vector<std::string>{"--help"}
                                                     : std::vector<std::string>{command, "--help"});
         const std::size_t begin = help.out.find("Examples:");
@@ -104,7 +122,7 @@ TEST_F(MarloShell, AnswersEveryExampleOfItsHelp) {
             EXPECT_NE(outcome.out, "") << line;
         }
     }
-    EXPECT_GT(examples, 12U);
+    EXPECT_GT(examples, 24U);
 }
 
 TEST_F(MarloShell, PassesItsLogOptionsToTheAgent) {
