@@ -33,15 +33,20 @@ constexpr std::array MEANINGS{
  * The only two places that touch the record. The callback writes it while the thread of an earlier event may still be
  * copying it; the agent holds the next event back until that thread has selected its node, which comes after.
  */
-__attribute__((noinline)) void storeEvent(const DateTime& time, const std::string& nodeString) {
+__attribute__((noinline)) void storeIndicationNetworkData(const DateTime& time, const std::string& nodeString) {
     indicationNetworkData.nodeString = nodeString;
     indicationNetworkData.eventTime = time;
     indicationNetworkData.userData = 0;
 }
 
-__attribute__((noinline)) void copyEvent(DateTime& time, std::string& nodeString) {
+__attribute__((noinline)) void copyIndicationNetworkData(DateTime& time, std::string& nodeString) {
     nodeString = indicationNetworkData.nodeString;
     time = indicationNetworkData.eventTime;
+}
+
+/** A context for the calling thread. The saved one may have been replaced by another thread just now. */
+__attribute__((noinline)) const CMPIContext* prepareFromAlertContext() {
+    return CBPrepareAttachThread(_alertBroker, _alertContext);
 }
 
 /** False, with the word "Failed", for a status that is no event. */
@@ -80,8 +85,8 @@ void NetworkAdapterHandler(unsigned int indicationClass, Orv::DateTime time, std
     log.variable("indicationClass", indicationClass);
     log.variable("_enabledNetwork", _enabledNetwork ? 1U : 0U);
     if (_enabledNetwork && indicationClass == 0) {
-        storeEvent(time, nodeString);
-        const CMPIContext* context = CBPrepareAttachThread(_alertBroker, _alertContext);
+        storeIndicationNetworkData(time, nodeString);
+        const CMPIContext* context = prepareFromAlertContext();
         (void)CBAttachThread(_alertBroker, context);
         ind_thread_id = _alertBroker->xft->newThread(NetworkAlertThread, nullptr, 1);
         (void)CBDetachThread(_alertBroker, context);
@@ -97,7 +102,7 @@ void* NetworkAlertThread(void* /*parm*/) {
     log.entering();
     DateTime time;
     std::string nodeString;
-    copyEvent(time, nodeString);
+    copyIndicationNetworkData(time, nodeString);
     processNetworkIndication(time, nodeString);
     log.exiting();
     return nullptr;
@@ -115,7 +120,7 @@ void processNetworkIndication(Orv::DateTime time, std::string nodeString) {
         log.exiting();
         return;
     }
-    const CMPIContext* context = CBPrepareAttachThread(_alertBroker, _alertContext);
+    const CMPIContext* context = prepareFromAlertContext();
     if (CBAttachThread(_alertBroker, context).rc != CMPI_RC_OK) {
         log.exiting();
         return;
