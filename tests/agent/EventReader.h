@@ -7,8 +7,8 @@
 #include "agent/events/Differences.h"
 #include "agent/events/Monitor.h"
 #include "agent/tree/Cursor.h"
+#include "tests/agent/Collection.h"
 
-#include <chrono>
 #include <condition_variable>
 #include <mutex>
 #include <ostream>
@@ -41,34 +41,6 @@ inline SeenEvent readEvent(Agent::BackEnd& backEnd, Agent::EventCode code, const
     cursor.get(NodeLexicon::PROP_STATUS, seen.status);
     return seen;
 }
-
-/** What several threads add to and a test waits for. */
-template <typename Value>
-class Collection {
-  public:
-    void add(Value value) {
-        const std::lock_guard lock(_mutex);
-        _values.push_back(std::move(value));
-        _changed.notify_all();
-    }
-
-    /** What there is as soon as there are so many, or half a minute has passed. */
-    std::vector<Value> await(std::size_t count) {
-        std::unique_lock lock(_mutex);
-        _changed.wait_for(lock, std::chrono::seconds(30), [&] { return _values.size() >= count; });
-        return _values;
-    }
-
-    std::vector<Value> now() {
-        const std::lock_guard lock(_mutex);
-        return _values;
-    }
-
-  private:
-    std::mutex _mutex;
-    std::condition_variable _changed;
-    std::vector<Value> _values;
-};
 
 /** Subscribes to the adapters of a monitor and reads every status event on a thread that is made for it. */
 class EventReader {
