@@ -6,6 +6,7 @@
 
 #include "tests/agent/EventReader.h"
 #include "tests/linux/BackEndFixture.h"
+#include "tests/linux/IpMonitor.h"
 
 #include <memory>
 #include <string>
@@ -16,18 +17,29 @@ namespace Orv::Test {
 class MonitorFixture : public BackEndFixture {
   protected:
     void TearDown() override {
+        ipMonitor.reset();
         reader.reset();
         monitor.reset();
     }
 
     /** From now on. */
     void startMonitoring() {
-        monitor = std::make_unique<Agent::Monitor>(
-            *backEnd, [this](int level, const std::string& text) { reports.add(std::to_string(level) + ' ' + text); });
+        ipMonitor = std::make_unique<IpMonitor>(*space);
+        monitor = std::make_unique<Agent::Monitor>(*backEnd, [this](int level, const std::string& text) {
+            reports.add(std::to_string(level) + ' ' + text);
+        });
         reader = std::make_unique<EventReader>(*backEnd, *monitor);
     }
 
-    /** The statuses of an adapter's status events so far. */
+    [[nodiscard]] std::vector<Transition> transitions() const {
+        std::vector<Transition> transitions;
+        for (const SeenEvent& event : reader->seen.now()) {
+            transitions.push_back({event.name, event.status});
+        }
+        return transitions;
+    }
+
+    /** The statuses of an adapter's events so far. */
     [[nodiscard]] std::vector<unsigned> statusesOf(const std::string& name) const {
         std::vector<unsigned> statuses;
         for (const SeenEvent& event : reader->seen.now()) {
@@ -43,9 +55,27 @@ class MonitorFixture : public BackEndFixture {
         EXPECT_EQ(awaited(statuses, [&] { return statusesOf(name); }), statuses) << name;
     }
 
+    /**
+     * The events are what `ip monitor` saw, of all interfaces, in the same order. Returns how many. Compared again
+     * when they are not: the kernel may have something to say while they are.
+     */
+    std::size_t expectAgreementWithIpMonitor() {
+        std::vector<Transition> expected;
+        bool isEqual = false;
+        for (int attempt = 0; attempt < 3 && !isEqual; ++attempt) {
+            expected = ipMonitor->transitions();
+            reader->seen.await(expected.size());
+            isEqual = transitions() == expected;
+        }
+        EXPECT_EQ(transitions(), expected);
+        EXPECT_EQ(reports.now(), std::vector<std::string>());
+        return expected.size();
+    }
+
     Collection<std::string> reports;
     std::unique_ptr<Agent::Monitor> monitor;
     std::unique_ptr<EventReader> reader;
+    std::unique_ptr<IpMonitor> ipMonitor;
 };
 
 } // namespace Orv::Test
