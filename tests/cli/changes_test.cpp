@@ -1,10 +1,13 @@
 /** The commands that change adapters, on a described host: what they write, what they print, how they fail. */
 #include "tests/cli/Marlo.h"
+#include "tests/support/Namespace.h"
 
 #include <fstream>
 #include <sstream>
 
 #include <gmock/gmock.h>
+#include <sys/mount.h>
+#include <sys/stat.h>
 
 namespace marlo::test {
 namespace {
@@ -237,6 +240,25 @@ TEST_F(MarloChanges, RestartIsRefusedForAHostThatIsOnlyDescribed) {
     const Outcome outcome = runProgram({MARLO_EXECUTABLE, "restart", "--tree", tree()});
     EXPECT_EQ(outcome.exitCode, 2);
     EXPECT_THAT(outcome.err, HasSubstr(message));
+}
+
+TEST_F(MarloChanges, RestartRunsTheHostsScriptAndShowsItsAnswer) {
+    REQUIRE_NAMESPACES();
+    const std::string configuration = write("agent.toml", "back_end = \"file\"\ntree_file = \"" + tree() + "\"\n");
+    const Orv::Test::Namespace space;
+    Outcome outcome;
+    std::string trail;
+    space.run([&] {
+        ASSERT_EQ(mount("tmpfs", "/etc/init.d", "tmpfs", 0, "mode=755"), 0);
+        std::ofstream("/etc/init.d/network") << "#!/bin/sh\necho $* >/etc/init.d/trail\n";
+        chmod("/etc/init.d/network", 0755);
+        outcome = runProgram({MARLO_EXECUTABLE, "restart", "--agent-config", configuration});
+        std::ifstream("/etc/init.d/trail") >> trail;
+    });
+    EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
+    EXPECT_EQ(outcome.out, "RestartNetwork = 0\n");
+    EXPECT_EQ(outcome.err, "marlo: nothing has changed\n");
+    EXPECT_EQ(trail, "restart");
 }
 
 TEST_F(MarloChanges, AdapterThatCannotBeReadIsNotChanged) {

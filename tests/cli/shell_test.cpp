@@ -68,7 +68,7 @@ TEST_F(MarloShell, CompletesCommandsAndOptions) {
 }
 
 TEST_F(MarloShell, CompletesClassesOfTheNamespaceAndFiles) {
-    EXPECT_THAT(complete("marlo enum MARLO_N"), ElementsAre("MARLO_NetworkAdapterConfiguration"));
+    EXPECT_THAT(complete("marlo enum MARLO_NetworkAdapterC"), ElementsAre("MARLO_NetworkAdapterConfiguration"));
     EXPECT_THAT(complete("marlo names -n root/quarn TAVIS_"), ElementsAre("TAVIS_NetworkCard", "TAVIS_NetworkPort"));
     EXPECT_THAT(complete("marlo get MARLO_L"), ElementsAre("MARLO_LogicalNetworkAdapter."));
     EXPECT_THAT(complete("marlo adapters --tree ho"), ElementsAre("host.toml"));

@@ -3,6 +3,8 @@
 #include "tests/support/scripted_agent/ScriptedAgent.h"
 
 #include <algorithm>
+#include <mutex>
+#include <optional>
 #include <stdexcept>
 
 using scripted_agent::add;
@@ -106,24 +108,37 @@ struct Instrumentation::State {
         return *selection[position];
     }
 
+    /** Guards the properties of all nodes: provider calls may write them from several threads. */
+    static std::mutex& properties() {
+        static std::mutex mutex;
+        return mutex;
+    }
+
+    template <typename Value>
+    std::optional<Value> find(NodeLexicon::Properties property, const Value& value) const {
+        const std::lock_guard lock(properties());
+        const auto& all = propertiesOf(node(), value);
+        const auto found = all.find(property);
+        return found != all.end() ? std::optional<Value>(found->second) : std::nullopt;
+    }
+
     template <typename Value>
     bool read(NodeLexicon::Properties property, Value& value) const {
         const std::string call = announced([&] {
             return "getProperty(" + nameOf(property) + ")" + (value == Value{} ? "" : " over " + shown(value));
         });
-        auto& properties = propertiesOf(node(), value);
-        const auto found = properties.find(property);
-        told(call, [&] { return found != properties.end() ? shown(found->second) : "absent"; });
-        if (found == properties.end()) {
-            return false;
+        const std::optional<Value> found = find(property, value);
+        told(call, [&] { return found ? shown(*found) : "absent"; });
+        if (found) {
+            value = *found;
         }
-        value = found->second;
-        return true;
+        return found.has_value();
     }
 
     template <typename Value>
     void write(NodeLexicon::Properties property, const Value& value) const {
         called([&] { return "setProperty(" + nameOf(property) + ", " + shown(value) + ")"; });
+        const std::lock_guard lock(properties());
         propertiesOf(node(), value)[property] = value;
     }
 };
