@@ -1,6 +1,7 @@
 #include "indication/NetworkIndication.h"
 #include "trace/Trace.h"
 
+#include <algorithm>
 #include <array>
 #include <cstdio>
 
@@ -11,15 +12,20 @@ namespace {
 /** Five characters and the zero that ends them; what does not fit is cut. */
 using FieldText = std::array<char, 6>;
 
+template <typename Number>
+std::string fieldText(const char* format, Number number) {
+    FieldText text{};
+    const int length = std::snprintf(text.data(), text.size(), format, number);
+    return {text.data(), std::min(static_cast<std::size_t>(std::max(length, 0)), text.size() - 1)};
+}
+
 constexpr std::size_t CALENDAR_WIDTH = 2;
 constexpr std::size_t FRACTION_WIDTH = 6;
 constexpr std::size_t OFFSET_WIDTH = 3;
 constexpr int MINUTES_PER_HOUR = 60;
 
 std::string number(unsigned int value) {
-    FieldText text{};
-    (void)std::snprintf(text.data(), text.size(), "%u", value);
-    return text.data();
+    return fieldText("%u", value);
 }
 
 std::string filledUp(const std::string& text, std::size_t width) {
@@ -28,9 +34,7 @@ std::string filledUp(const std::string& text, std::size_t width) {
 
 /** The sign of a positive offset stands before the zeros; that of a negative one is part of what they fill up. */
 std::string offsetText(int hours) {
-    FieldText text{};
-    (void)std::snprintf(text.data(), text.size(), "%d", hours * MINUTES_PER_HOUR);
-    const std::string minutes = text.data();
+    const std::string minutes = fieldText("%d", hours * MINUTES_PER_HOUR);
     return (minutes.find('-') == std::string::npos ? "+" : "") + filledUp(minutes, OFFSET_WIDTH);
 }
 

@@ -219,12 +219,17 @@ bool setGateway(Change& change, const std::string& gateway) {
     return change.invoke("SetGateways", {{"DefaultIPGateway", texts({gateway})}});
 }
 
+/** Sets what is not empty; ends with the first failure. */
+bool setTexts(Change& change, const char* method, const char* argument, const std::vector<std::string>& values) {
+    return values.empty() || change.invoke(method, {{argument, texts(values)}});
+}
+
 bool setNameService(Change& change, const Options& options) {
-    return (options.servers.empty() ||
-            change.invoke("SetDNSServerSearchOrder", {{"DNSServerSearchOrder", texts(options.servers)}})) &&
-           (options.suffixes.empty() ||
-            change.invoke("SetDNSSuffixSearchOrder", {{"DNSDomainSuffixSearchOrder", texts(options.suffixes)}})) &&
-           (options.domain.empty() || change.invoke("SetDNSDomain", {{"DNSDomain", Value::string(options.domain)}}));
+    if (!setTexts(change, "SetDNSServerSearchOrder", "DNSServerSearchOrder", options.servers) ||
+        !setTexts(change, "SetDNSSuffixSearchOrder", "DNSDomainSuffixSearchOrder", options.suffixes)) {
+        return false;
+    }
+    return options.domain.empty() || change.invoke("SetDNSDomain", {{"DNSDomain", Value::string(options.domain)}});
 }
 
 /** What a command does, made ready before anything is read or changed, so that a wrong command line changes nothing.
