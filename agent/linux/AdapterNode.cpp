@@ -31,17 +31,11 @@ void set(PropertyMap& properties, Properties property, unsigned int number) {
     properties.emplace(property, number);
 }
 
-std::optional<AddressMode> modeOf(const Link& link, const std::vector<std::uint8_t>& permanentAddress,
-                                  const Address* ipv4, const HostConfiguration& configuration) {
+std::optional<AddressMode> modeOf(const InterfaceFacts& facts, const Address* ipv4,
+                                  const HostConfiguration& configuration) {
     if (ipv4 != nullptr && (ipv4->flags & IFA_F_PERMANENT) == 0) {
         return AddressMode::leased;
     }
-    const InterfaceFacts facts{link.index,
-                               link.name,
-                               hardwareAddressText(link.address).value_or(""),
-                               hardwareAddressText(permanentAddress).value_or(""),
-                               link.kind,
-                               link.hardwareType == ARPHRD_ETHER};
     const std::optional<AddressMode> configured = configuration.modeOf(facts);
     return configured || ipv4 == nullptr ? configured : AddressMode::fixed;
 }
@@ -69,6 +63,15 @@ void setResolver(PropertyMap& properties, ResolverSettings settings, const std::
 
 } // namespace
 
+InterfaceFacts factsOf(const Link& link, const std::vector<std::uint8_t>& permanentAddress) {
+    return {link.index,
+            link.name,
+            hardwareAddressText(link.address).value_or(""),
+            hardwareAddressText(permanentAddress).value_or(""),
+            link.kind,
+            link.hardwareType == ARPHRD_ETHER};
+}
+
 PropertyMap adapterProperties(const Link& link, const std::vector<std::uint8_t>& permanentAddress,
                               const KernelState& state, const HostConfiguration& configuration) {
     const KernelState::Addresses& addresses = state.addressesOf(link.index);
@@ -82,7 +85,7 @@ PropertyMap adapterProperties(const Link& link, const std::vector<std::uint8_t>&
     if (const auto gateway = gatewayOf(state, link.index)) {
         set(properties, PROP_DEFAULT_GATEWAY, gateway->text());
     }
-    if (const auto mode = modeOf(link, permanentAddress, ipv4, configuration)) {
+    if (const auto mode = modeOf(factsOf(link, permanentAddress), ipv4, configuration)) {
         set(properties, PROP_DHCP_ENABLED, static_cast<unsigned int>(*mode));
     }
     setResolver(properties, configuration.resolverOf(link.index), configuration.hostName());

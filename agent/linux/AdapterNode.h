@@ -10,6 +10,9 @@
 
 namespace Orv::Agent::Linux {
 
+/** What the host's files recognise the interface by. */
+InterfaceFacts factsOf(const Link& link, const std::vector<std::uint8_t>& permanentAddress);
+
 /**
  * Of a property nothing is known: it is absent. The codes:
  * - PROP_STATUS as AdapterStatus.

@@ -4,6 +4,7 @@
 #include "agent/linux/Selection.h"
 #include "agent/text/Text.h"
 
+#include <algorithm>
 #include <exception>
 #include <utility>
 
@@ -63,6 +64,18 @@ void HostTree::rebuild(const KernelState& state, const HostConfiguration& config
 Tree::NodePointer HostTree::adapter(int index) const {
     const auto found = _interfaces.find(index);
     return found == _interfaces.end() ? nullptr : found->second.adapter;
+}
+
+std::optional<int> HostTree::adapterAt(const std::string& path) const {
+    const auto found = std::find_if(_interfaces.begin(), _interfaces.end(), [&](const auto& known) {
+        return known.second.adapter && known.second.adapter->path == path;
+    });
+    return found == _interfaces.end() ? std::nullopt : std::optional(found->first);
+}
+
+InterfaceFacts HostTree::facts(const Link& link) const {
+    const auto found = _interfaces.find(link.index);
+    return factsOf(link, found == _interfaces.end() ? link.permanentAddress : found->second.permanentAddress);
 }
 
 std::vector<Tree::NodePointer> HostTree::ancestors(int index, const HostConfiguration& configuration) const {

@@ -18,6 +18,7 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <optional>
 #include <set>
 #include <string>
 #include <vector>
@@ -47,6 +48,12 @@ class HostTree {
 
     /** The adapter node of an interface as it was last built; null when there is none. */
     [[nodiscard]] NodePointer adapter(int index) const;
+
+    /** The interface whose adapter node, as it was last built, has this path. */
+    [[nodiscard]] std::optional<int> adapterAt(const std::string& path) const;
+
+    /** What the host's files recognise an interface by; `link` is one that the last tree was built from. */
+    [[nodiscard]] InterfaceFacts facts(const Link& link) const;
 
     /** What is above that node, from its device up; empty when there is no such node. */
     [[nodiscard]] std::vector<NodePointer> ancestors(int index, const HostConfiguration& configuration) const;

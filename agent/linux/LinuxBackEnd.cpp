@@ -4,11 +4,14 @@
 #include "agent/linux/HostTree.h"
 #include "agent/linux/KernelReader.h"
 #include "agent/linux/LinkEvents.h"
+#include "agent/persistence/Manager.h"
+#include "agent/persistence/NameService.h"
+#include "agent/write/HostWriter.h"
+#include "agent/write/KernelWriter.h"
 
 #include <mutex>
 #include <optional>
 #include <set>
-#include <stdexcept>
 #include <utility>
 
 namespace Orv::Agent::Linux {
@@ -22,7 +25,13 @@ HardwareSource realHardware(const std::string& root) {
 
 class LinuxBackEnd : public BackEnd {
   public:
-    explicit LinuxBackEnd(const HostPaths& paths) : _configuration(paths.root), _tree(realHardware(paths.root)) {}
+    LinuxBackEnd(const HostPaths& paths, Persistence::Environment host)
+        : _configuration(paths.root),
+          _tree(realHardware(paths.root)),
+          _host(std::move(host)),
+          _writer(writerParts()) {
+        _host.root = paths.root;
+    }
 
     std::shared_ptr<const Tree> snapshot() override {
         const std::lock_guard lock(_mutex);
@@ -31,11 +40,8 @@ class LinuxBackEnd : public BackEnd {
 
     std::unique_ptr<EventWatch> watch(EventSink& sink) override;
 
-    void setProperty(const std::string& path, NodeLexicon::Properties property,
-                     const PropertyValue& /*value*/) override {
-        const Tree::NodePointer node = snapshot()->find(path);
-        throw std::runtime_error((node ? node->description : path) + ": property " + std::to_string(property) +
-                                 " cannot be set: this host's adapters are only read");
+    void setProperty(const std::string& path, NodeLexicon::Properties property, const PropertyValue& value) override {
+        _writer.write(path, property, value);
     }
 
   private:
@@ -56,12 +62,35 @@ class LinuxBackEnd : public BackEnd {
         return _current;
     }
 
-    std::mutex _mutex; ///< guards everything below
+    WriterParts writerParts() {
+        return {[this](const std::string& path) { return look(path); },
+                [this](int index) {
+                    const std::lock_guard lock(_mutex);
+                    return _kernel.state().links().count(index) != 0;
+                },
+                [this](const InterfaceFacts& interface) { return Persistence::managerOf(interface, _host); },
+                [this](const InterfaceFacts& interface) { return Persistence::nameServiceOf(interface, _host); },
+                std::make_unique<KernelWriter>()};
+    }
+
+    std::optional<AdapterFacts> look(const std::string& path) {
+        const std::lock_guard lock(_mutex);
+        const Tree::NodePointer node = current()->find(path);
+        const std::optional<int> index = _tree.adapterAt(path);
+        if (!node || !index) {
+            return std::nullopt;
+        }
+        return AdapterFacts{_tree.facts(_kernel.state().links().at(*index)), node->properties};
+    }
+
+    std::mutex _mutex; ///< guards what follows, up to the writing parts
     KernelReader _kernel;
     HostConfiguration _configuration;
     HostTree _tree;
     std::set<int> _pending; ///< interfaces whose nodes are out of date, kept when building them fails
     std::shared_ptr<const Tree> _current;
+    Persistence::Environment _host; ///< not changed any more
+    HostWriter _writer;
 };
 
 /**
@@ -106,8 +135,8 @@ std::unique_ptr<EventWatch> LinuxBackEnd::watch(EventSink& sink) {
 
 } // namespace
 
-std::unique_ptr<BackEnd> makeLinuxBackEnd(HostPaths paths) {
-    return std::make_unique<LinuxBackEnd>(paths);
+std::unique_ptr<BackEnd> makeLinuxBackEnd(HostPaths paths, Persistence::Environment host) {
+    return std::make_unique<LinuxBackEnd>(paths, std::move(host));
 }
 
 } // namespace Orv::Agent::Linux

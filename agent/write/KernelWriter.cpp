@@ -206,7 +206,7 @@ bool KernelWriter::sharesDefault(const RouteObject& route, int index) {
             }).empty();
 }
 
-void KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& wanted) {
+InterfaceTables KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& wanted) {
     AddressPlan plan = planAddress(before, wanted.address);
     InterfaceTables expected{before.index, plan.result, before.routes};
     const auto old = formerSource(before, wanted);
@@ -238,6 +238,7 @@ void KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& want
     if (!expected.addresses.empty() && !expected.routes.empty()) {
         putBackRoutes(expected, read(before.index), old);
     }
+    return expected;
 }
 
 /** With `formerSource`, routes from that address go: in tables other than the main one the kernel leaves them. */
@@ -275,10 +276,10 @@ void KernelWriter::putBackRoutes(const InterfaceTables& wanted, const InterfaceT
     }
 }
 
-void KernelWriter::putBack(const InterfaceTables& before) {
-    const InterfaceTables present = read(before.index);
+void KernelWriter::putBack(const InterfaceTables& wanted) {
+    const InterfaceTables present = read(wanted.index);
     ChangeBatch missing;
-    for (const AddressObject& address : before.addresses) {
+    for (const AddressObject& address : wanted.addresses) {
         const bool there = std::any_of(present.addresses.begin(), present.addresses.end(),
                                        [&](const AddressObject& one) { return one.isSame(address); });
         if (!there) {
@@ -286,7 +287,7 @@ void KernelWriter::putBack(const InterfaceTables& before) {
         }
     }
     apply(std::move(missing), {EEXIST});
-    putBackRoutes(before, present, std::nullopt);
+    putBackRoutes(wanted, present, std::nullopt);
 }
 
 void KernelWriter::restore(const InterfaceTables& before) {

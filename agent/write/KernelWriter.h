@@ -4,48 +4,31 @@
  */
 #pragma once
 
-#include "agent/change/AdapterSettings.h"
 #include "agent/linux/NetlinkSocket.h"
 #include "agent/write/ChangeSocket.h"
-#include "agent/write/KernelObject.h"
+#include "agent/write/LiveIpv4.h"
 
+#include <initializer_list>
 #include <mutex>
 #include <optional>
-#include <vector>
 
 namespace Orv::Agent::Linux {
 
 /**
- * Writes addresses and routes in the network namespace in which it was made, through rtnetlink(7). IPv6 is never
- * touched. Operations may be called from any thread; each goes to the kernel by itself, so that writers on different
- * interfaces hardly wait for one another. Throws std::system_error that says what was asked for and the kernel's
- * reason; ENODEV: the interface is gone.
+ * Writes addresses and routes in the network namespace in which it was made, through rtnetlink(7). Each exchange goes
+ * to the kernel by itself, so that writers on different interfaces hardly wait for one another.
+ *
+ * Other addresses stay. Since the kernel drops or promotes secondary addresses with their primary one, and orders
+ * addresses by age, they may have to leave for a moment and come back; the interface is never without an address
+ * meanwhile. Routes that the kernel drops on this way are put back, with the new address as their source where it was
+ * the old one.
  */
-class KernelWriter {
+class KernelWriter : public LiveIpv4 {
   public:
-    /** What the kernel has for the interface. Routes of a kind that the kernel makes by itself are left out. */
-    [[nodiscard]] InterfaceTables read(int index);
-
-    /**
-     * Brings about what is wanted of an interface that is as in `before`: `address` becomes the address that stands
-     * for it, for good, in place of the one that does now; `gateway` that of its default route, whose metric, table
-     * and other attributes stay. Absent ones are removed; so is nothing else.
-     *
-     * Other addresses stay. Since the kernel drops or promotes secondary addresses with their primary one, and orders
-     * addresses by age, they may have to leave for a moment and come back; the interface is never without an address
-     * meanwhile. Routes that the kernel drops on this way are put back, with the new address as their source where it
-     * was the old one. After an exception use restore().
-     */
-    void write(const InterfaceTables& before, const Ipv4Settings& wanted);
-
-    /**
-     * Puts back the addresses and routes of `before` that are gone now and removes nothing: for what other programs
-     * take away on their way.
-     */
-    void putBack(const InterfaceTables& before);
-
-    /** Makes addresses and default routes those of `before` again. */
-    void restore(const InterfaceTables& before);
+    [[nodiscard]] InterfaceTables read(int index) override;
+    InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted) override;
+    void putBack(const InterfaceTables& wanted) override;
+    void restore(const InterfaceTables& before) override;
 
   private:
     void apply(ChangeBatch batch, std::initializer_list<int> tolerated);

@@ -1,0 +1,41 @@
+/**
+ * @file
+ * What the running system has for IPv4 on an interface, as far as it can be changed.
+ */
+#pragma once
+
+#include "agent/change/AdapterSettings.h"
+#include "agent/write/KernelObject.h"
+
+namespace Orv::Agent::Linux {
+
+/**
+ * Any thread may call any operation. Failures are thrown as std::system_error that says what was asked for and the
+ * reason; ENODEV: the interface is gone. IPv6 is never touched.
+ */
+class LiveIpv4 {
+  public:
+    LiveIpv4() = default;
+    virtual ~LiveIpv4() = default;
+    LiveIpv4(const LiveIpv4&) = delete;
+    LiveIpv4& operator=(const LiveIpv4&) = delete;
+
+    /** What there is for the interface. Routes of a kind that the kernel makes by itself are left out. */
+    [[nodiscard]] virtual InterfaceTables read(int index) = 0;
+
+    /**
+     * Brings about what is wanted of an interface that is as in `before`: `address` becomes the address that stands
+     * for it, for good, in place of the one that does now; `gateway` that of its default route, whose metric, table
+     * and other attributes stay. Absent ones are removed; so is nothing else. Returns what the interface should have
+     * now. After an exception use restore().
+     */
+    virtual InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted) = 0;
+
+    /** Adds those of the addresses and routes that are missing, and removes nothing. */
+    virtual void putBack(const InterfaceTables& wanted) = 0;
+
+    /** Makes addresses and default routes those of `before` again. */
+    virtual void restore(const InterfaceTables& before) = 0;
+};
+
+} // namespace Orv::Agent::Linux
