@@ -89,7 +89,9 @@ void AdapterChange::putFilesBack() {
 void AdapterChange::changeKernel() {
     const InterfaceTables before = _parts.live->read(_interface.index);
     _undo.add([this, before] { _parts.live->restore(before); });
-    _expected = _parts.live->write(before, *_wanted.ipv4);
+    const bool endsLease = goesTo(AddressMode::fixed) && _inForce.ipv4->mode == AddressMode::leased;
+    _expected =
+        _parts.live->write(before, *_wanted.ipv4, endsLease ? LiveIpv4::Leases::leave : LiveIpv4::Leases::stay);
 }
 
 void AdapterChange::tellNameService() {
@@ -101,8 +103,8 @@ void AdapterChange::startClient() {
     _undo.add([this] { (void)_manager->stopDhcp(_interface); });
     _manager->startDhcp(_interface);
     if (_expected) {
-        // Clients clear an interface on their way.
-        _parts.live->putBack(*_expected);
+        // Clients clear an interface on their way, and add what they bring behind what is left.
+        _parts.live->welcomeLease(*_expected);
     }
 }
 

@@ -97,24 +97,20 @@ AddressPlan keep(const InterfaceTables& before, std::size_t place) {
     return plan;
 }
 
-} // namespace
+/** Whether an address goes for good; the arguments are those of exchangeFor(). */
+bool goes(const AddressObject& address, const AddressObject* old, bool endLeases) {
+    return &address == old || (endLeases && !address.isPermanent());
+}
 
-AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4Prefixed>& wanted) {
-    const std::optional<std::size_t> place = reportedAddress(before);
-    const AddressObject* old = place ? &before.addresses[*place] : nullptr;
-    std::optional<AddressObject> fresh;
-    if (wanted) {
-        fresh = makeAddress(before, *wanted, old);
-        if (old != nullptr && old->isSame(*fresh)) {
-            return keep(before, *place);
-        }
-    }
+/** Has `fresh`, or nothing, in the place of `old`, which is one of those in `before` or null. */
+AddressPlan exchangeFor(const InterfaceTables& before, const AddressObject* fresh, const AddressObject* old,
+                        bool endLeases) {
     std::vector<AddressObject> leaving;
     std::vector<AddressObject> returning;
     AddressPlan plan;
     for (const AddressObject& address : before.addresses) {
-        const bool replaced = &address == old || (fresh && address.isSame(*fresh));
-        const bool moves = !replaced && mustMove(address, fresh ? &*fresh : nullptr, old);
+        const bool replaced = goes(address, old, endLeases) || (fresh != nullptr && address.isSame(*fresh));
+        const bool moves = !replaced && mustMove(address, fresh, old);
         if (replaced || moves) {
             leaving.push_back(address);
         } else {
@@ -124,7 +120,7 @@ AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4P
             returning.push_back(address);
         }
     }
-    if (fresh) {
+    if (fresh != nullptr) {
         exchange(plan, before, leaving, *fresh);
         plan.result.push_back(*fresh);
     } else {
@@ -135,6 +131,32 @@ AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4P
         plan.result.push_back(address);
     }
     return plan;
+}
+
+} // namespace
+
+AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4Prefixed>& wanted, bool endLeases) {
+    const std::optional<std::size_t> place = reportedAddress(before);
+    const AddressObject* old = place ? &before.addresses[*place] : nullptr;
+    if (!wanted) {
+        return exchangeFor(before, nullptr, old, endLeases);
+    }
+    const AddressObject fresh = makeAddress(before, *wanted, old);
+    const bool onlyStays = old != nullptr && old->isSame(fresh);
+    const bool othersStay = !endLeases || std::all_of(before.addresses.begin(), before.addresses.end(),
+                                                      [&](const AddressObject& address) {
+                                                          return &address == old || address.isPermanent();
+                                                      });
+    return onlyStays && othersStay ? keep(before, *place) : exchangeFor(before, &fresh, old, endLeases);
+}
+
+AddressPlan planLeaseFirst(const InterfaceTables& before) {
+    const auto lease = std::find_if(before.addresses.begin(), before.addresses.end(),
+                                    [](const AddressObject& address) { return !address.isPermanent(); });
+    if (lease == before.addresses.end() || &*lease == &before.addresses[*reportedAddress(before)]) {
+        return {{}, before.addresses};
+    }
+    return exchangeFor(before, &*lease, nullptr, false);
 }
 
 } // namespace Orv::Agent::Linux

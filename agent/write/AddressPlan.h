@@ -19,12 +19,16 @@ struct AddressPlan {
 };
 
 /**
- * Plans to have `wanted`, or nothing, in the place of the address that stands for the interface. Pure.
+ * Plans to have `wanted`, or nothing, in the place of the address that stands for the interface; with `endLeases`
+ * also to remove the others that run out. Pure.
  *
  * The kernel reports addresses in the order in which they came, makes the later of two in one network a secondary,
  * and on removal of a primary address either removes its secondaries or promotes the first (promote_secondaries). So
  * all that would come before the new address leaves and comes back behind it, whatever that setting is.
  */
-AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4Prefixed>& wanted);
+AddressPlan planAddress(const InterfaceTables& before, const std::optional<Ipv4Prefixed>& wanted, bool endLeases);
+
+/** Plans to have the first address that runs out stand for the interface; no steps when it does, or there is none. */
+AddressPlan planLeaseFirst(const InterfaceTables& before);
 
 } // namespace Orv::Agent::Linux

@@ -206,8 +206,8 @@ bool KernelWriter::sharesDefault(const RouteObject& route, int index) {
             }).empty();
 }
 
-InterfaceTables KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& wanted) {
-    AddressPlan plan = planAddress(before, wanted.address);
+InterfaceTables KernelWriter::write(const InterfaceTables& before, const Ipv4Settings& wanted, Leases leases) {
+    AddressPlan plan = planAddress(before, wanted.address, leases == Leases::leave);
     InterfaceTables expected{before.index, plan.result, before.routes};
     const auto old = formerSource(before, wanted);
     for (RouteObject& route : expected.routes) {
@@ -276,18 +276,21 @@ void KernelWriter::putBackRoutes(const InterfaceTables& wanted, const InterfaceT
     }
 }
 
-void KernelWriter::putBack(const InterfaceTables& wanted) {
+void KernelWriter::welcomeLease(const InterfaceTables& wanted) {
     const InterfaceTables present = read(wanted.index);
-    ChangeBatch missing;
+    AddressPlan plan = planLeaseFirst(present);
     for (const AddressObject& address : wanted.addresses) {
         const bool there = std::any_of(present.addresses.begin(), present.addresses.end(),
                                        [&](const AddressObject& one) { return one.isSame(address); });
         if (!there) {
-            missing.add(RTM_NEWADDR, NLM_F_CREATE, address, "putting back an address");
+            plan.steps.add(RTM_NEWADDR, NLM_F_CREATE, address, "putting back an address");
         }
     }
-    apply(std::move(missing), {EEXIST});
-    putBackRoutes(wanted, present, std::nullopt);
+    apply(std::move(plan.steps), {EEXIST, EADDRNOTAVAIL});
+    const InterfaceTables now = read(wanted.index);
+    // Of the two, the client's routes come first.
+    putBackRoutes(present, now, std::nullopt);
+    putBackRoutes(wanted, now, std::nullopt);
 }
 
 void KernelWriter::restore(const InterfaceTables& before) {

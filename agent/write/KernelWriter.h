@@ -26,8 +26,8 @@ namespace Orv::Agent::Linux {
 class KernelWriter : public LiveIpv4 {
   public:
     [[nodiscard]] InterfaceTables read(int index) override;
-    InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted) override;
-    void putBack(const InterfaceTables& wanted) override;
+    InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted, Leases leases) override;
+    void welcomeLease(const InterfaceTables& wanted) override;
     void restore(const InterfaceTables& before) override;
 
   private:

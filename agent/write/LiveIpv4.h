@@ -23,16 +23,22 @@ class LiveIpv4 {
     /** What there is for the interface. Routes of a kind that the kernel makes by itself are left out. */
     [[nodiscard]] virtual InterfaceTables read(int index) = 0;
 
+    /** What becomes of addresses that run out, beside the one that stands for the interface. */
+    enum class Leases { stay, leave };
+
     /**
      * Brings about what is wanted of an interface that is as in `before`: `address` becomes the address that stands
      * for it, for good, in place of the one that does now; `gateway` that of its default route, whose metric, table
-     * and other attributes stay. Absent ones are removed; so is nothing else. Returns what the interface should have
-     * now. After an exception use restore().
+     * and other attributes stay. Absent ones are removed; beside them, nothing but `leases`. Returns what the
+     * interface should have now. After an exception use restore().
      */
-    virtual InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted) = 0;
+    virtual InterfaceTables write(const InterfaceTables& before, const Ipv4Settings& wanted, Leases leases) = 0;
 
-    /** Adds those of the addresses and routes that are missing, and removes nothing. */
-    virtual void putBack(const InterfaceTables& wanted) = 0;
+    /**
+     * To be called when a DHCP client has begun to run: adds those addresses and routes of `wanted` that it removed,
+     * and has the leased address, where there is one already, stand for the interface.
+     */
+    virtual void welcomeLease(const InterfaceTables& wanted) = 0;
 
     /** Makes addresses and default routes those of `before` again. */
     virtual void restore(const InterfaceTables& before) = 0;

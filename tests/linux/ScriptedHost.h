@@ -148,12 +148,12 @@ class ScriptedKernel : public Agent::Linux::LiveIpv4 {
         return {index, {}, {}};
     }
 
-    Tables write(const Tables& before, const Agent::Ipv4Settings& wanted) override {
+    Tables write(const Tables& before, const Agent::Ipv4Settings& wanted, Leases /*leases*/) override {
         _host.step("write" + lineOf("", wanted).substr(0, lineOf("", wanted).size() - 1));
         return before;
     }
 
-    void putBack(const Tables& /*wanted*/) override { _host.step("put back"); }
+    void welcomeLease(const Tables& /*wanted*/) override { _host.step("welcome"); }
 
     void restore(const Tables& /*before*/) override { _host.step("restore"); }
 

@@ -60,7 +60,7 @@ TEST_F(HostWriterTest, endsTheClientBeforeItMakesALeaseLast) {
 TEST_F(HostWriterTest, startsTheClientWhenEverythingElseIsDone) {
     writer.write("eth0", PROP_DHCP_ENABLED, dhcp);
     EXPECT_THAT(host.takeSteps(),
-                ElementsAre("plan eth0", "read", "write dhcp", "activate eth0", "start eth0", "put back"));
+                ElementsAre("plan eth0", "read", "write dhcp", "activate eth0", "start eth0", "welcome"));
     EXPECT_EQ(host.fileText(), "# made by hand\neth0 dhcp\n");
 }
 
@@ -159,7 +159,7 @@ INSTANTIATE_TEST_SUITE_P(
         Failure{"eth1", PROP_DHCP_ENABLED, fixed, "write static 198.51.100.10/24 via 198.51.100.1",
                 Steps{"restore", "activate eth1", "start eth1"}},
         Failure{"eth0", PROP_DHCP_ENABLED, dhcp, "start eth0", Steps{"stop eth0", "restore", "activate eth0"}},
-        Failure{"eth0", PROP_DHCP_ENABLED, dhcp, "put back", Steps{"stop eth0", "restore", "activate eth0"}},
+        Failure{"eth0", PROP_DHCP_ENABLED, dhcp, "welcome", Steps{"stop eth0", "restore", "activate eth0"}},
         Failure{"eth0", PROP_DNS_SERVERS, std::vector<std::string>{"192.0.2.99"}, "plan names",
                 Steps{"activate eth0"}},
         Failure{"eth0", PROP_DNS_SERVERS, std::vector<std::string>{"192.0.2.99"}, "names eth0 192.0.2.99",

@@ -59,7 +59,9 @@ class KernelWriterTest : public testing::Test {
     }
 
     /** On the test's own thread, which is in another namespace. */
-    void write(const Ipv4Settings& wanted) const { writer->write(writer->read(index), wanted); }
+    void write(const Ipv4Settings& wanted, LiveIpv4::Leases leases = LiveIpv4::Leases::stay) const {
+        writer->write(writer->read(index), wanted, leases);
+    }
 
     void addAddresses(std::initializer_list<const char*> addresses) const {
         for (const char* address : addresses) {
@@ -188,7 +190,8 @@ TEST_F(KernelWriterTest, putsBackARouteWhoseGatewayIsOutOfReachNow) {
 TEST_F(KernelWriterTest, neverLosesTheDefaultRouteWhileItExchangesTheAddress) {
     addAddresses({"192.0.2.10/24"});
     space->ip("route add default via 192.0.2.1 dev left");
-    space->shell("mount -t tmpfs tmpfs /mnt; { ip monitor route > /mnt/routes 2> /dev/null & echo $! > /mnt/pid; }; sleep 0.2");
+    space->shell("mount -t tmpfs tmpfs /mnt; { ip monitor route > /mnt/routes 2> /dev/null & echo $! > /mnt/pid; }; "
+                 "sleep 0.2");
     write(fixedAt("192.0.2.20/24", "192.0.2.1"));
     space->ip("route add 10.99.0.0/16 dev left");
     const std::string seen =
@@ -259,22 +262,39 @@ TEST_F(KernelWriterTest, restoresWhatWasThereBefore) {
     for (const Ipv4Settings& wanted :
          {fixedAt("192.0.2.99/24", "192.0.2.9"), fixedAt("203.0.113.5/24", "203.0.113.1"), fixedAt("192.0.2.11/24"),
           Ipv4Settings{AddressMode::leased, std::nullopt, std::nullopt}}) {
-        writer->write(before, wanted);
+        writer->write(before, wanted, LiveIpv4::Leases::stay);
         EXPECT_NE(writer->read(index), before);
         writer->restore(before);
         EXPECT_EQ(writer->read(index), before);
     }
 }
 
-TEST_F(KernelWriterTest, putsBackWhatOthersTookAwayAndRemovesNothing) {
+TEST_F(KernelWriterTest, putsBackWhatAClientTookAway) {
     addAddresses({"192.0.2.10/24", "192.0.2.11/24"});
     space->ip("route add 10.0.0.0/8 via 192.0.2.2 dev left");
     const InterfaceTables before = writer->read(index);
     space->ip("addr flush dev left");
-    addAddresses({"198.51.100.1/24"});
-    writer->putBack(before);
-    EXPECT_THAT(addresses(), ElementsAre("198.51.100.1/24", "192.0.2.10/24", "192.0.2.11/24 secondary"));
+    writer->welcomeLease(before);
+    EXPECT_THAT(addresses(), ElementsAre("192.0.2.10/24", "192.0.2.11/24 secondary"));
     EXPECT_THAT(routes(), ElementsAre("10.0.0.0/8 via 192.0.2.2"));
+}
+
+TEST_F(KernelWriterTest, hasALeaseStandForTheInterface) {
+    addAddresses({"192.0.2.10/24", "203.0.113.1/24"});
+    space->ip("route add 10.0.0.0/8 via 203.0.113.2 dev left src 203.0.113.1");
+    const InterfaceTables before = writer->read(index);
+    addAddresses({"192.0.2.50/24 brd + valid_lft 3600 preferred_lft 3600"});
+    space->ip("route add default via 192.0.2.1 dev left");
+    writer->welcomeLease(before);
+    EXPECT_THAT(addresses(),
+                ElementsAre("192.0.2.50/24 brd 192.0.2.255 dynamic", "203.0.113.1/24", "192.0.2.10/24 secondary"));
+    EXPECT_THAT(routes(), ElementsAre("10.0.0.0/8 via 203.0.113.2 src 203.0.113.1", "default via 192.0.2.1"));
+}
+
+TEST_F(KernelWriterTest, leavesNoOtherLeaseWhereOneIsMadeToLast) {
+    addAddresses({"192.0.2.10/24", "203.0.113.1/24", "192.0.2.50/24 valid_lft 3600 preferred_lft 3600"});
+    write(fixedAt("192.0.2.10/24"), LiveIpv4::Leases::leave);
+    EXPECT_THAT(addresses(), ElementsAre("192.0.2.10/24 brd 192.0.2.255", "203.0.113.1/24"));
 }
 
 /** The text and number of the failure of `work`. */
@@ -304,7 +324,8 @@ TEST_F(KernelWriterTest, saysThatTheInterfaceIsGone) {
     addAddresses({"192.0.2.10/24"});
     const InterfaceTables before = writer->read(index);
     space->ip("link del left");
-    EXPECT_EQ(failureOf([&] { writer->write(before, fixedAt("192.0.2.20/24")); }).first, ENODEV);
+    EXPECT_EQ(failureOf([&] { writer->write(before, fixedAt("192.0.2.20/24"), LiveIpv4::Leases::stay); }).first,
+              ENODEV);
     EXPECT_EQ(failureOf([&] { (void)writer->read(index); }).first, ENODEV);
 }
 
@@ -313,7 +334,10 @@ TEST_F(KernelWriterTest, changesNothingWithoutThePrivilege) {
     const InterfaceTables before = writer->read(index);
     space->run([&] {
         dropNetworkPrivilege();
-        EXPECT_EQ(failureOf([&] { writer->write(before, fixedAt("192.0.2.20/24", "192.0.2.1")); }).first, EPERM);
+        EXPECT_EQ(failureOf([&] {
+                      writer->write(before, fixedAt("192.0.2.20/24", "192.0.2.1"), LiveIpv4::Leases::stay);
+                  }).first,
+                  EPERM);
         writer->restore(before);
     });
     EXPECT_EQ(writer->read(index), before);
