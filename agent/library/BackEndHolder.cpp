@@ -7,6 +7,7 @@
 
 #include <atomic>
 #include <mutex>
+#include <utility>
 
 namespace Orv::Agent {
 
@@ -16,7 +17,9 @@ std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
     if (configuration.backEnd == Configuration::BackEndKind::File) {
         return makeFileBackEnd(configuration.treeFile, configuration.control);
     }
-    return Linux::makeLinuxBackEnd();
+    Persistence::Environment host;
+    host.report = [](const std::string& line) { reportFailure("setProperty", line.c_str()); };
+    return Linux::makeLinuxBackEnd({}, std::move(host));
 }
 
 } // namespace
