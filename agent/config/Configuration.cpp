@@ -3,11 +3,13 @@
 #include "agent/config/TextFile.h"
 #include "agent/config/TomlReader.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cstdlib>
 #include <filesystem>
 #include <stdexcept>
 #include <system_error>
+#include <utility>
 
 namespace Orv::Agent {
 
@@ -34,6 +36,30 @@ std::optional<Configuration::BackEndKind> backEndOf(std::string_view name) {
         return Configuration::BackEndKind::Linux;
     }
     return name == "file" ? std::optional(Configuration::BackEndKind::File) : std::nullopt;
+}
+
+std::string unknownManager(const std::string& name) {
+    return R"(expected "auto", "ifupdown", "networkd" or "none", found ")" + name + '"';
+}
+
+std::optional<ManagerChoice> managerOf(std::string_view name) {
+    constexpr std::pair<std::string_view, ManagerChoice> choices[] = {{"auto", ManagerChoice::automatic},
+                                                                      {"ifupdown", ManagerChoice::ifupdown},
+                                                                      {"networkd", ManagerChoice::networkd},
+                                                                      {"none", ManagerChoice::none}};
+    const auto* const found = std::find_if(std::begin(choices), std::end(choices),
+                                           [&](const auto& choice) { return choice.first == name; });
+    return found == std::end(choices) ? std::nullopt : std::optional(found->second);
+}
+
+void readPersistence(TomlReader& reader, Configuration& configuration) {
+    if (const auto name = reader.text("persistence")) {
+        const auto choice = managerOf(*name);
+        if (!choice) {
+            reader.refuseKey("persistence", unknownManager(*name));
+        }
+        configuration.persistence = *choice;
+    }
 }
 
 void readChannel(TomlReader& file, const std::string& path, std::string_view name, ChannelConfiguration& channel) {
@@ -138,6 +164,16 @@ void overrideBackEnd(Configuration& configuration) {
     }
 }
 
+void overridePersistence(Configuration& configuration) {
+    if (const auto name = filledVariable("ORV_AGENT_PERSISTENCE")) {
+        const auto choice = managerOf(*name);
+        if (!choice) {
+            refuseVariable("ORV_AGENT_PERSISTENCE", unknownManager(*name));
+        }
+        configuration.persistence = *choice;
+    }
+}
+
 Configuration readConfiguredFile() {
     if (const auto path = filledVariable("ORV_AGENT_CONFIG")) {
         return readConfigurationFile(*path);
@@ -160,6 +196,7 @@ Configuration readConfigurationFile(const std::string& path) {
     TomlReader reader(table, path, "");
     Configuration configuration;
     readBackEnd(reader, path, configuration);
+    readPersistence(reader, configuration);
     readChannel(reader, path, "log", configuration.log);
     readChannel(reader, path, "trace", configuration.trace);
     reader.refuseOtherKeys();
@@ -169,6 +206,7 @@ Configuration readConfigurationFile(const std::string& path) {
 Configuration loadConfiguration() {
     Configuration configuration = readConfiguredFile();
     overrideBackEnd(configuration);
+    overridePersistence(configuration);
     overrideLevel("ORV_AGENT_LOG_LEVEL", configuration.log.level);
     overrideSinks("ORV_AGENT_LOG_SINKS", configuration.log.sinks);
     overrideLevel("ORV_AGENT_TRACE_LEVEL", configuration.trace.level);

@@ -40,6 +40,8 @@ struct NetworkUnit {
     std::map<std::string, std::string> match; ///< the [Match] section; values given one after the other are joined
     bool leases = false;                      ///< DHCP= covers IPv4
     bool hasAddress = false;                  ///< it sets an IPv4 address
+    std::string path;                         ///< of the .network file
+    std::vector<std::string> dropIns;         ///< their paths, in the order in which they are read
 
     /**
      * Whether it applies to the interface. Conditions on what is not known here (driver, path, host, ...) count as
@@ -64,6 +66,9 @@ struct Networkd {
 
     /** What is configured for the interface. */
     [[nodiscard]] std::optional<AddressMode> modeOf(const InterfaceFacts& interface) const;
+
+    /** The unit that is applied to the interface, else the first that would be; null when there is none. */
+    [[nodiscard]] const NetworkUnit* unitOf(const InterfaceFacts& interface) const;
 
     bool operator==(const Networkd&) const = default;
 };

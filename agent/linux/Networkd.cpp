@@ -193,12 +193,17 @@ std::optional<AddressMode> Networkd::modeOf(const InterfaceFacts& interface) con
     if (std::binary_search(leases.begin(), leases.end(), interface.index)) {
         return AddressMode::leased;
     }
+    const NetworkUnit* unit = unitOf(interface);
+    return unit == nullptr ? std::nullopt : unit->mode();
+}
+
+const NetworkUnit* Networkd::unitOf(const InterfaceFacts& interface) const {
     if (const auto applied = assigned.find(interface.index); applied != assigned.end()) {
-        return applied->second ? units.at(*applied->second).mode() : std::nullopt;
+        return applied->second ? &units.at(*applied->second) : nullptr;
     }
     const auto unit = std::find_if(units.begin(), units.end(),
                                    [&](const NetworkUnit& candidate) { return candidate.matches(interface); });
-    return unit == units.end() ? std::nullopt : unit->mode();
+    return unit == units.end() ? nullptr : &*unit;
 }
 
 Networkd readNetworkd(HostFiles& files) {
@@ -213,9 +218,11 @@ Networkd readNetworkd(HostFiles& files) {
             continue;
         }
         NetworkUnit unit;
+        unit.path = path;
         parseNetworkUnit(files.read(path).value_or(""), unit);
         for (const auto& [dropIn, dropInPath] : firstOfEach(dropInsOf(files, directories, name), ".conf")) {
             parseNetworkUnit(files.read(dropInPath).value_or(""), unit);
+            unit.dropIns.push_back(dropInPath);
         }
         unitByPath[path] = networkd.units.size();
         networkd.units.push_back(std::move(unit));

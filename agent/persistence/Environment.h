@@ -4,6 +4,8 @@
  */
 #pragma once
 
+#include "agent/config/Configuration.h"
+
 #include <chrono>
 #include <functional>
 #include <string>
@@ -11,8 +13,7 @@
 
 namespace Orv::Agent::Persistence {
 
-/** Which manager's configuration is written. */
-enum class ManagerChoice { automatic, ifupdown, networkd, none };
+using Agent::ManagerChoice;
 
 /** Programs of the host that are run, by path; each with the arguments that come first. */
 struct Commands {

@@ -1,6 +1,7 @@
 #include "agent/persistence/Ifupdown.h"
 #include "agent/persistence/Manager.h"
 #include "agent/persistence/NetworkManager.h"
+#include "agent/persistence/Networkd.h"
 #include "agent/persistence/Unmanaged.h"
 
 #include <filesystem>
@@ -21,8 +22,14 @@ std::unique_ptr<Manager> detected(const InterfaceFacts& interface, const Environ
     if (NetworkManager::knows(interface, environment)) {
         return std::make_unique<NetworkManager>();
     }
+    if (Networkd::knows(interface, environment)) {
+        return std::make_unique<Networkd>(environment);
+    }
     if (hasIfupdown(environment)) {
         return std::make_unique<Ifupdown>(environment);
+    }
+    if (Networkd::runs(environment)) {
+        return std::make_unique<Networkd>(environment);
     }
     return std::make_unique<Unmanaged>(environment);
 }
@@ -33,6 +40,8 @@ std::unique_ptr<Manager> managerOf(const InterfaceFacts& interface, const Enviro
     switch (environment.choice) {
     case ManagerChoice::ifupdown:
         return std::make_unique<Ifupdown>(environment);
+    case ManagerChoice::networkd:
+        return std::make_unique<Networkd>(environment);
     case ManagerChoice::none:
         return std::make_unique<Unmanaged>(environment);
     default:

@@ -10,6 +10,7 @@ namespace {
 
 using Orv::Agent::Configuration;
 using Orv::Agent::loadConfiguration;
+using Orv::Agent::ManagerChoice;
 using Orv::Agent::readConfigurationFile;
 using Orv::Test::messageOf;
 using Orv::Test::TemporaryFile;
@@ -18,7 +19,7 @@ using testing::IsEmpty;
 
 constexpr const char* variables[] = {"ORV_AGENT_CONFIG",      "ORV_AGENT_BACKEND",   "ORV_AGENT_TREE",
                                      "ORV_AGENT_LOG_LEVEL",   "ORV_AGENT_LOG_SINKS", "ORV_AGENT_TRACE_LEVEL",
-                                     "ORV_AGENT_TRACE_SINKS", "ORV_AGENT_CONTROL"};
+                                     "ORV_AGENT_TRACE_SINKS", "ORV_AGENT_CONTROL",   "ORV_AGENT_PERSISTENCE"};
 
 void clearVariables() {
     for (const char* name : variables) {
@@ -59,6 +60,7 @@ TEST_F(ConfigurationTest, ReadsEveryKey) {
 back_end = "file"
 tree_file = "/srv/lab.toml"
 control = "lab.control"
+persistence = "networkd"
 [log]
 level = 4000
 sinks = ["syslog", "file:/var/log/marlo.log"]
@@ -70,7 +72,8 @@ sinks = ["stderr"]
                                  "/srv/lab.toml",
                                  {4000, {"syslog", "file:/var/log/marlo.log"}},
                                  {3000, {"stderr"}},
-                                 (file.directory() / "lab.control").string()};
+                                 (file.directory() / "lab.control").string(),
+                                 ManagerChoice::networkd};
     EXPECT_EQ(readConfigurationFile(file.path()), expected);
 }
 
@@ -115,6 +118,8 @@ INSTANTIATE_TEST_SUITE_P(
         Refused{"BackEndOfAnotherType", "back_end = 1\n", ":1: back_end: expected a string, found an integer"},
         Refused{"UnknownBackEnd", "back_end = \"bsd\"\n",
                 ":1: back_end: expected \"linux\" or \"file\", found \"bsd\""},
+        Refused{"UnknownManager", "persistence = \"wicked\"\n",
+                ":1: persistence: expected \"auto\", \"ifupdown\", \"networkd\" or \"none\", found \"wicked\""},
         Refused{"FileBackEndWithoutAFile", "back_end = \"file\"\n",
                 ":1: back_end: the file back end needs tree_file"},
         Refused{"ChannelOfAnotherType", "trace = true\n", ":1: trace: expected a table, found a boolean"},
@@ -147,11 +152,13 @@ TEST_F(ConfigurationTest, IsOverriddenByTheEnvironment) {
     ::setenv("ORV_AGENT_TRACE_LEVEL", "3000", 1);
     ::setenv("ORV_AGENT_TRACE_SINKS", "syslog", 1);
     ::setenv("ORV_AGENT_CONTROL", "lab.control", 1);
+    ::setenv("ORV_AGENT_PERSISTENCE", "none", 1);
     const Configuration expected{Configuration::BackEndKind::File,
                                  "lab.toml",
                                  {4000, {"stderr", "file:/tmp/a b"}},
                                  {3000, {"syslog"}},
-                                 "lab.control"};
+                                 "lab.control",
+                                 ManagerChoice::none};
     EXPECT_EQ(loadConfiguration(), expected);
 }
 
@@ -161,7 +168,8 @@ TEST_F(ConfigurationTest, SwitchesAChannelOffByAnEmptyListOfSinks) {
 }
 
 TEST_F(ConfigurationTest, TakesOtherEmptyVariablesAsNotSet) {
-    for (const char* name : {"ORV_AGENT_BACKEND", "ORV_AGENT_TREE", "ORV_AGENT_LOG_LEVEL", "ORV_AGENT_TRACE_LEVEL"}) {
+    for (const char* name : {"ORV_AGENT_BACKEND", "ORV_AGENT_TREE", "ORV_AGENT_PERSISTENCE", "ORV_AGENT_LOG_LEVEL",
+                             "ORV_AGENT_TRACE_LEVEL"}) {
         ::setenv(name, "", 1);
     }
     EXPECT_EQ(loadConfiguration(), Configuration());
@@ -203,6 +211,8 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         RefusedVariable{"ORV_AGENT_BACKEND", "bsd", ": expected \"linux\" or \"file\", found \"bsd\""},
         RefusedVariable{"ORV_AGENT_BACKEND", "file", ": the file back end needs ORV_AGENT_TREE"},
+        RefusedVariable{"ORV_AGENT_PERSISTENCE", "Auto",
+                        ": expected \"auto\", \"ifupdown\", \"networkd\" or \"none\", found \"Auto\""},
         RefusedVariable{"ORV_AGENT_LOG_LEVEL", "high", ": expected an integer from 0 to 2147483647, found \"high\""},
         RefusedVariable{"ORV_AGENT_LOG_LEVEL", "60 ", ": expected an integer from 0 to 2147483647, found \"60 \""},
         RefusedVariable{"ORV_AGENT_TRACE_LEVEL", "-1", ": expected an integer from 0 to 2147483647, found \"-1\""},
