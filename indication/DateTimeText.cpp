@@ -1,31 +1,19 @@
 #include "indication/NetworkIndication.h"
 #include "trace/Trace.h"
 
-#include <algorithm>
-#include <array>
-#include <cstdio>
-
 namespace Orv::NetworkAdapterComposite {
 
 namespace {
 
-/** Five characters and the zero that ends them; what does not fit is cut. */
-using FieldText = std::array<char, 6>;
-
-template <typename Number>
-std::string fieldText(const char* format, Number number) {
-    FieldText text{};
-    const int length = std::snprintf(text.data(), text.size(), format, number);
-    return {text.data(), std::min(static_cast<std::size_t>(std::max(length, 0)), text.size() - 1)};
-}
-
+/** A field has room for so many characters; what does not fit is cut. */
+constexpr std::size_t FIELD_ROOM = 5;
 constexpr std::size_t CALENDAR_WIDTH = 2;
 constexpr std::size_t FRACTION_WIDTH = 6;
 constexpr std::size_t OFFSET_WIDTH = 3;
 constexpr int MINUTES_PER_HOUR = 60;
 
-std::string number(unsigned int value) {
-    return fieldText("%u", value);
+std::string number(int value) {
+    return std::to_string(value).substr(0, FIELD_ROOM);
 }
 
 std::string filledUp(const std::string& text, std::size_t width) {
@@ -34,7 +22,7 @@ std::string filledUp(const std::string& text, std::size_t width) {
 
 /** The sign of a positive offset stands before the zeros; that of a negative one is part of what they fill up. */
 std::string offsetText(int hours) {
-    const std::string minutes = fieldText("%d", hours * MINUTES_PER_HOUR);
+    const std::string minutes = number(hours * MINUTES_PER_HOUR);
     return (minutes.find('-') == std::string::npos ? "+" : "") + filledUp(minutes, OFFSET_WIDTH);
 }
 
@@ -44,8 +32,7 @@ std::string convertCIMDateTime(Orv::DateTime time) {
     const ProviderLog log(loggerNetworkIndication, INDICATION_UNIT, __func__);
     log.entering();
     std::string text = number(time.getYear());
-    for (const unsigned int field :
-         {time.getMonth(), time.getDay(), time.getHour(), time.getMinute(), time.getSecond()}) {
+    for (const int field : {time.getMonth(), time.getDay(), time.getHour(), time.getMinute(), time.getSecond()}) {
         text += filledUp(number(field), CALENDAR_WIDTH);
     }
     text += "." + filledUp(number(time.getMillisecond()), FRACTION_WIDTH);
