@@ -18,6 +18,7 @@ std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
         return makeFileBackEnd(configuration.treeFile, configuration.control);
     }
     Persistence::Environment host;
+    host.choice = configuration.persistence;
     host.report = [](const std::string& line) { reportFailure("setProperty", line.c_str()); };
     return Linux::makeLinuxBackEnd({}, std::move(host));
 }

@@ -5,10 +5,15 @@
 #include "agent/persistence/NetworkdFile.h"
 #include "agent/persistence/SystemBus.h"
 
-#include <algorithm>
+#include <cstring>
 #include <filesystem>
+#include <memory>
 #include <stdexcept>
 #include <thread>
+
+#include <arpa/inet.h>
+#include <ifaddrs.h>
+#include <netinet/in.h>
 
 namespace Orv::Agent::Persistence {
 
@@ -135,6 +140,7 @@ class Plan {
 struct LinkState {
     std::optional<FileStamp> stamp;
     bool isConfigured = false;
+    bool isConfiguring = false;
     bool hasUnit = false;
 };
 
@@ -146,6 +152,7 @@ LinkState stateOf(const InterfaceFacts& interface, const Environment& environmen
         state.stamp = file.stamp;
         for (const std::string_view line : Linux::linesOf(file.text)) {
             state.isConfigured = state.isConfigured || line == "ADMIN_STATE=configured";
+            state.isConfiguring = state.isConfiguring || line == "ADMIN_STATE=configuring";
             state.hasUnit = state.hasUnit || line.starts_with("NETWORK_FILE=/");
         }
     } catch (const std::system_error&) {
@@ -154,13 +161,37 @@ LinkState stateOf(const InterfaceFacts& interface, const Environment& environmen
     return state;
 }
 
-/** True when the interface is configured; `before` is the state before networkd was told to look. */
+/** Whether the kernel has the address on the interface. */
+bool hasAddress(const InterfaceFacts& interface, const Ipv4Settings& wanted) {
+    ifaddrs* first = nullptr;
+    if (::getifaddrs(&first) != 0) {
+        return false;
+    }
+    const std::unique_ptr<ifaddrs, void (*)(ifaddrs*)> all(first, ::freeifaddrs);
+    for (const ifaddrs* entry = first; entry != nullptr; entry = entry->ifa_next) {
+        if (entry->ifa_addr == nullptr || entry->ifa_addr->sa_family != AF_INET ||
+            interface.name != entry->ifa_name) {
+            continue;
+        }
+        sockaddr_in address{};
+        std::memcpy(&address, entry->ifa_addr, sizeof address);
+        if (!wanted.address || ntohl(address.sin_addr.s_addr) == wanted.address->address.number) {
+            return wanted.address.has_value();
+        }
+    }
+    return !wanted.address;
+}
+
+/**
+ * True when IPv4 of the interface is configured; the rest may take as long as routers of IPv6 are looked for.
+ * `before` is the state before networkd was told to look.
+ */
 bool awaitConfigured(const InterfaceFacts& interface, const Environment& environment, const LinkState& before,
-                     milliseconds patience) {
-    for (milliseconds waited{0}; waited < patience; waited += step) {
+                     const Ipv4Settings& wanted) {
+    for (milliseconds waited{0}; waited < patienceWithNetworkd; waited += step) {
         const LinkState now = stateOf(interface, environment);
         const bool hasMoved = now.stamp != before.stamp || waited >= patienceWithNothing;
-        if (now.isConfigured && hasMoved) {
+        if (hasMoved && (now.isConfigured || (now.isConfiguring && hasAddress(interface, wanted)))) {
             return true;
         }
         std::this_thread::sleep_for(step);
@@ -192,7 +223,7 @@ void Networkd::activate(const InterfaceFacts& interface, const AdapterSettings& 
     if (!wanted.ipv4 || wanted.ipv4->mode == AddressMode::leased) {
         return;
     }
-    if (!awaitConfigured(interface, _environment, before, patienceWithNetworkd) && _environment.report) {
+    if (!awaitConfigured(interface, _environment, before, *wanted.ipv4) && _environment.report) {
         _environment.report(interface.name + ": systemd-networkd is still at work on it");
     }
 }

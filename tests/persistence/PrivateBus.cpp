@@ -81,6 +81,8 @@ std::string whyNoBus() {
 }
 
 PrivateBus::PrivateBus() {
+    // Services may run as users of their own.
+    std::filesystem::permissions(_files.root(), std::filesystem::perms(0755));
     _files.write("/bus.conf", "<busconfig><listen>" + address() +
                                   "</listen><auth>EXTERNAL</auth><policy context=\"default\">"
                                   "<allow send_destination=\"*\"/><allow receive_sender=\"*\"/><allow own=\"*\"/>"
