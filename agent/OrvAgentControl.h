@@ -14,6 +14,7 @@ extern "C" {
 #endif
 
 /** Receives a logged line on the thread that logs it. Must not log and must not throw. */
+// NOLINTNEXTLINE(modernize-use-using): C reads it too
 typedef void (*OrvAgentLogObserver)(int level, const char* logger, const char* message, void* context);
 
 /**

@@ -19,7 +19,7 @@ class Write {
           _property(property),
           _value(value),
           _ipv4(inForce.ipv4.value_or(Ipv4Settings{})),
-          _pending(std::move(pending)) {}
+          _pending(pending) {}
 
     Resolution resolve();
 

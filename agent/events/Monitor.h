@@ -32,6 +32,7 @@ class Monitor : private EventSink {
         std::uintptr_t callback;
         const void* context;
 
+        // NOLINTNEXTLINE(modernize-use-nullptr): takes the comparison with 0 for one with a pointer
         auto operator<=>(const Key&) const = default;
     };
 

@@ -15,7 +15,9 @@ DateTime::DateTime(const Fields& fields) : _state(std::make_unique<State>(State{
 DateTime::DateTime(const DateTime& other) : DateTime(other._state->fields) {}
 
 DateTime& DateTime::operator=(const DateTime& other) {
-    *_state = *other._state;
+    if (this != &other) {
+        *_state = *other._state;
+    }
     return *this;
 }
 

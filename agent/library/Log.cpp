@@ -83,7 +83,7 @@ struct LogChannel::Sink {
     /** Says once that lines are lost: a full disk must neither stop the agent nor go by unnoticed. */
     void reportOnce(const char* reason) noexcept {
         if (!hasFailed.exchange(true)) {
-            std::fprintf(stderr, "log sink %s: lines are lost: %s\n", name.c_str(), reason);
+            (void)std::fprintf(stderr, "log sink %s: lines are lost: %s\n", name.c_str(), reason);
         }
     }
 
@@ -110,7 +110,7 @@ void LogChannel::configure(const ChannelConfiguration& configuration, const std:
         try {
             sinks->push_back(std::make_shared<Sink>(name, pattern));
         } catch (const std::exception& failure) {
-            std::fprintf(stderr, "log sink %s: not opened: %s\n", name.c_str(), failure.what());
+            (void)std::fprintf(stderr, "log sink %s: not opened: %s\n", name.c_str(), failure.what());
         }
     }
     const int threshold = sinks->empty() ? nothing : configuration.level;

@@ -44,7 +44,7 @@ bool isPlaceholder(std::string text) {
 } // namespace
 
 std::string readSystemIdentifier(const std::string& root) {
-    const std::string firmware = firstLine(root + firmwareFile);
+    std::string firmware = firstLine(root + firmwareFile);
     if (isIdentifier(firmware) && !isPlaceholder(firmware)) {
         return firmware;
     }
