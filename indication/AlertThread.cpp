@@ -67,10 +67,8 @@ bool interpret(unsigned int status, std::string& indicationClassName, std::strin
 void deliver(const CMPIContext* context, const CMPIInstance* instance, const ProviderLog& log) {
     log.message(LEVEL_FLOW, "processNetworkIndication : Calling CB Deliver Indication ");
     const CMPIStatus status = CBDeliverIndication(_alertBroker, context, INDICATION_NAMESPACE, instance);
-    if (status.rc != CMPI_RC_OK) {
-        if (_alertBroker != nullptr) {
-            (void)CMNewString(_alertBroker, DELIVERY_FAILED, nullptr);
-        }
+    if (status.rc != CMPI_RC_OK && _alertBroker != nullptr) {
+        (void)CMNewString(_alertBroker, DELIVERY_FAILED, nullptr);
         (void)CMTraceMessage(_alertBroker, CMPI_LEV_INFO, "NetworkAdapterProvider", DELIVERY_FAILED, nullptr);
     }
     log.message(LEVEL_FLOW, "processNetworkIndication : CB Deliver Indication done");
