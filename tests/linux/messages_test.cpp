@@ -46,6 +46,41 @@ Attributes usualLink() {
         .add(IFLA_PARENT_DEV_BUS_NAME, "pci");
 }
 
+/** A bond as the kernel announces it, with its mode in front and what follows behind. */
+Message bondMessage(const Attributes& info) {
+    return MessageBytes(RTM_NEWLINK, linkHeader(9, IFF_UP),
+                        Attributes().add(IFLA_IFNAME, "bond0").add(IFLA_LINKINFO, info))
+        .parse();
+}
+
+Link bondOf(const Message& message) {
+    return std::get<Change<Link>>(message).object;
+}
+
+TEST(LinkMessage, givesTheMembersOfABond) {
+    const Attributes data = Attributes()
+                                .add(IFLA_BOND_MODE, Octets{1})
+                                .add(IFLA_BOND_ACTIVE_SLAVE, std::uint32_t{3})
+                                .add(IFLA_BOND_MIIMON, std::uint32_t{100})
+                                .add(IFLA_BOND_PRIMARY, std::uint32_t{2});
+    const Link bond = bondOf(bondMessage(
+        Attributes().add(IFLA_INFO_KIND, "bond").add(IFLA_INFO_DATA | NLA_F_NESTED, data).add(IFLA_INFO_XSTATS, "")));
+    EXPECT_EQ(bond.kind, "bond");
+    EXPECT_EQ(bond.activeMember, 3);
+    EXPECT_EQ(bond.primaryMember, 2);
+    EXPECT_EQ(bondOf(bondMessage(Attributes().add(IFLA_INFO_DATA, data).add(IFLA_INFO_KIND, "bond"))), bond)
+        << "in any order";
+}
+
+TEST(LinkMessage, knowsNoMembersOfOtherKindsAndOfBondsWithoutAny) {
+    const Attributes data = Attributes().add(IFLA_BOND_ACTIVE_SLAVE, std::uint32_t{3});
+    EXPECT_EQ(bondOf(bondMessage(Attributes().add(IFLA_INFO_KIND, "vxlan").add(IFLA_INFO_DATA, data))).activeMember,
+              0);
+    EXPECT_EQ(bondOf(bondMessage(Attributes().add(IFLA_INFO_KIND, "bond"))).activeMember, 0);
+    const Attributes cut = Attributes().add(IFLA_BOND_ACTIVE_SLAVE, Octets{3, 0});
+    EXPECT_EQ(bondOf(bondMessage(Attributes().add(IFLA_INFO_KIND, "bond").add(IFLA_INFO_DATA, cut))).activeMember, 0);
+}
+
 TEST(LinkMessage, givesEveryField) {
     const Message message = MessageBytes(RTM_NEWLINK, linkHeader(7, IFF_UP | IFF_RUNNING), usualLink()).parse();
     const Link expected{
