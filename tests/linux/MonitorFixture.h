@@ -8,7 +8,9 @@
 #include "tests/linux/BackEndFixture.h"
 #include "tests/linux/IpMonitor.h"
 
+#include <algorithm>
 #include <memory>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -67,9 +69,26 @@ class MonitorFixture : public BackEndFixture {
             reader->seen.await(expected.size());
             isEqual = transitions() == expected;
         }
-        EXPECT_EQ(transitions(), expected);
+        EXPECT_TRUE(isEqual) << firstDifference(transitions(), expected);
         EXPECT_EQ(reports.now(), std::vector<std::string>());
         return expected.size();
+    }
+
+    /** Where two long lists part, for people. */
+    static std::string firstDifference(const std::vector<Transition>& events,
+                                       const std::vector<Transition>& expected) {
+        const auto place = std::mismatch(events.begin(), events.end(), expected.begin(), expected.end());
+        std::ostringstream text;
+        text << events.size() << " events, " << expected.size() << " expected; from number "
+             << place.first - events.begin() << " on:\n";
+        for (auto event = place.first; event != events.end() && event - place.first < 5; ++event) {
+            text << "  " << *event << '\n';
+        }
+        text << "instead of:\n";
+        for (auto other = place.second; other != expected.end() && other - place.second < 5; ++other) {
+            text << "  " << *other << '\n';
+        }
+        return text.str();
     }
 
     Collection<std::string> reports;
