@@ -99,9 +99,10 @@ class LinuxBackEnd : public BackEnd {
  */
 class LinuxBackEnd::Watch : public EventWatch {
   public:
-    Watch(LinuxBackEnd& backEnd, EventSink& sink) : _backEnd(backEnd) {
+    Watch(LinuxBackEnd& backEnd, EventSink& sink) : _backEnd(backEnd), _sink(sink) {
         const std::lock_guard lock(_backEnd._mutex);
         _backEnd.current();
+        _fullReads = _backEnd._kernel.fullReads();
         _events.emplace(_backEnd._tree, sink, _backEnd._kernel.state());
         _backEnd._kernel.onStep([this](const KernelState& state) { take(state); });
     }
@@ -116,6 +117,9 @@ class LinuxBackEnd::Watch : public EventWatch {
     void collect() override {
         const std::lock_guard lock(_backEnd._mutex);
         _backEnd._kernel.follow();
+        if (std::exchange(_fullReads, _backEnd._kernel.fullReads()) != _backEnd._kernel.fullReads()) {
+            _sink.report("the kernel's notifications came too fast: events that left no difference may be missing");
+        }
     }
 
   private:
@@ -126,6 +130,8 @@ class LinuxBackEnd::Watch : public EventWatch {
     }
 
     LinuxBackEnd& _backEnd;
+    EventSink& _sink;
+    unsigned _fullReads = 0;
     std::optional<LinkEvents> _events;
 };
 
