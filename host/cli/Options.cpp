@@ -65,7 +65,7 @@ Examples:
   marlo invoke eth0 SetDNSServerSearchOrder DNSServerSearchOrder=192.0.2.53,192.0.2.54 --json)";
 
 constexpr const char* SetExamples = R"(What can be set is IPv4Address and SubnetMask (read as IPAddress and IPSubnet),
-DefaultIPGateway and DNSDomain. The way in which the adapter gets its address stays as it is.
+DefaultIPGateway and DNSDomain. Whether the address comes from DHCP stays as it is; while it does, no other can be set.
 
 Examples:
   marlo set eth0 IPv4Address=198.51.100.24 SubnetMask=255.255.254.0
