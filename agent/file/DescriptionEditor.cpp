@@ -87,7 +87,8 @@ class TableEditor {
 
     [[nodiscard]] std::size_t lineBegin(std::size_t place) const {
         const std::size_t before = place == 0 ? std::string_view::npos : _text.rfind('\n', place - 1);
-        return before == std::string_view::npos ? 0 : before + 1;
+        const std::size_t first = _text.starts_with(byteOrderMark) ? byteOrderMark.size() : 0;
+        return before == std::string_view::npos ? first : before + 1;
     }
 
     /** Behind the end of the line, or the end of the text. */

@@ -2,7 +2,7 @@
 
 #include "agent/persistence/DhcpClient.h"
 #include "agent/persistence/InterfacesFiles.h"
-#include "agent/persistence/Joined.h"
+#include "agent/persistence/StanzaChange.h"
 
 #include <algorithm>
 #include <array>
@@ -18,7 +18,6 @@ namespace {
 using Place = InterfacesFiles::Place;
 
 constexpr std::array<std::string_view, 4> editableMethods{"static", "dhcp", "bootp", "manual"};
-constexpr std::array<std::string_view, 5> addressOptions{"address", "netmask", "broadcast", "network", "gateway"};
 
 /** iface NAME FAMILY METHOD ... */
 bool isStanzaOf(const Place& place, const std::string& interface) {
@@ -91,85 +90,6 @@ const Place* stanzaOf(const InterfacesFiles& files, const std::string& interface
     return found;
 }
 
-/** A mask as the file writes masks: in dotted form, or as a number. */
-std::string maskLike(const std::string& before, std::uint8_t prefixLength) {
-    const bool isNumber = before.find_first_not_of("0123456789") == std::string::npos;
-    return isNumber ? std::to_string(prefixLength) : maskOf(prefixLength).text();
-}
-
-void editAddress(StanzaEditor& editor, const Ipv4Prefixed& address) {
-    const std::string before = editor.value("address").value_or("");
-    const auto mask = editor.value("netmask");
-    const bool maskSays = mask && before.find('/') == std::string::npos;
-    editor.set("address", maskSays ? address.address.text() : address.text());
-    if (mask && prefixLengthOf(Ipv4Address::parse(*mask).value_or(Ipv4Address{1})) != address.prefixLength) {
-        editor.set("netmask", maskLike(*mask, address.prefixLength));
-    }
-    // "+" and "-" are computed anew by ifup; a written out address would be that of the former network.
-    if (Ipv4Address::parse(editor.value("broadcast").value_or(""))) {
-        editor.set("broadcast", address.broadcast().text());
-    }
-    if (editor.value("network")) {
-        editor.set("network", Ipv4Address{address.address.number & maskOf(address.prefixLength).number}.text());
-    }
-}
-
-void editIpv4(StanzaEditor& editor, const Ipv4Settings& wanted, const std::string& method) {
-    const bool isLeased = wanted.mode == AddressMode::leased;
-    if (isLeased || !wanted.address) {
-        editor.setHeaderWord(3, !isLeased ? "manual" : method == "bootp" ? "bootp" : "dhcp");
-        for (const std::string_view option : addressOptions) {
-            editor.remove(option);
-        }
-        return;
-    }
-    editor.setHeaderWord(3, "static");
-    editAddress(editor, *wanted.address);
-    if (wanted.gateway) {
-        editor.set("gateway", wanted.gateway->text(), {"address", "netmask", "broadcast", "network"});
-    } else {
-        editor.remove("gateway");
-    }
-}
-
-/** One dns-* option: edited where it stands, added where resolvconf is there to read it. */
-void editName(StanzaEditor& editor, std::string_view option, const std::string& value, bool isAdded) {
-    if (value.empty()) {
-        editor.remove(option);
-    } else if (editor.value(option)) {
-        editor.set(option, value);
-    } else if (isAdded) {
-        editor.append(option, value);
-    }
-}
-
-void editNames(StanzaEditor& editor, const NameSettings& wanted, bool isAdded) {
-    if (wanted.servers) {
-        // The older form has a line for each server.
-        const bool isOlder = editor.value("dns-nameserver").has_value();
-        editor.remove("dns-nameserver");
-        editName(editor, "dns-nameservers", joined(*wanted.servers), isAdded || isOlder);
-    }
-    if (wanted.suffixes) {
-        editName(editor, "dns-search", joined(*wanted.suffixes), isAdded);
-    }
-    if (wanted.domain) {
-        editName(editor, "dns-domain", *wanted.domain, isAdded);
-    }
-}
-
-/** The content of the file with the stanza edited. */
-std::string edited(const InterfacesFile& file, const InterfacesFile::Stanza& stanza, const AdapterSettings& wanted,
-                   bool namesAreRead) {
-    TextEdit edit;
-    StanzaEditor editor(file, stanza, edit);
-    if (wanted.ipv4) {
-        editIpv4(editor, *wanted.ipv4, file.header(stanza).words[3].text);
-    }
-    editNames(editor, wanted.names, namesAreRead);
-    return edit.applied(file.text());
-}
-
 /** Whether a script that ifup runs hands dns-* options on. */
 bool readsNames(const Environment& environment) {
     const bool hasResolved = std::filesystem::exists(environment.root + "/etc/network/if-up.d/resolved") &&
@@ -197,24 +117,22 @@ std::string withStanza(const InterfacesFiles& files, const InterfacesFile& file,
     return text + "iface " + interface.name + " inet manual" + newline;
 }
 
+FileEdits edit(const std::string& path, const std::optional<std::string>& before, std::optional<std::string> after) {
+    if (!after) {
+        throw std::runtime_error(path + ": cannot be edited in the form that it has");
+    }
+    return after == before ? FileEdits{} : FileEdits{{path, before, std::move(after)}};
+}
+
 } // namespace
 
 FileEdits Ifupdown::plan(const InterfaceFacts& interface, const AdapterSettings& wanted) const {
     const InterfacesFiles files(_environment.root);
     refuseIndirection(files, interface.name);
     const bool namesAreRead = readsNames(_environment);
-    const Place* place = stanzaOf(files, interface.name);
-    if (place != nullptr) {
+    if (const Place* place = stanzaOf(files, interface.name); place != nullptr) {
         const InterfacesFile& file = place->file->content;
-        std::string after = edited(file, *place->stanza, wanted, namesAreRead);
-        // What cannot be taken apart as it was put together is better not written.
-        const InterfacesFile result(after);
-        const std::size_t number = static_cast<std::size_t>(place->stanza - file.stanzas().data());
-        if (number >= result.stanzas().size() ||
-            edited(result, result.stanzas()[number], wanted, namesAreRead) != after) {
-            throw std::runtime_error(place->file->path + ": cannot be edited in the form that it has");
-        }
-        return after == file.text() ? FileEdits{} : FileEdits{{place->file->path, file.text(), std::move(after)}};
+        return edit(place->file->path, file.text(), changedStanza(file, *place->stanza, wanted, namesAreRead));
     }
     const bool saysSomething = wanted.ipv4 && (wanted.ipv4->mode == AddressMode::leased || wanted.ipv4->address);
     if (!saysSomething) {
@@ -222,9 +140,9 @@ FileEdits Ifupdown::plan(const InterfaceFacts& interface, const AdapterSettings&
     }
     const auto* main = files.mainFile();
     const InterfacesFile bare(withStanza(files, main != nullptr ? main->content : InterfacesFile(""), interface));
-    return {{InterfacesFiles::mainPath(_environment.root),
-             main != nullptr ? std::optional(main->content.text()) : std::nullopt,
-             edited(bare, bare.stanzas().back(), wanted, namesAreRead)}};
+    return edit(InterfacesFiles::mainPath(_environment.root),
+                main != nullptr ? std::optional(main->content.text()) : std::nullopt,
+                changedStanza(bare, bare.stanzas().back(), wanted, namesAreRead));
 }
 
 bool Ifupdown::knows(const InterfaceFacts& interface, const Environment& environment) {

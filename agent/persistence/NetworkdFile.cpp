@@ -62,6 +62,8 @@ Entry readEntry(std::string_view line, std::string_view& text) {
             whole += bare(next);
         }
     }
+    // Nothing is left to go on with; written back, it would take the next line for its own.
+    whole.resize(whole.find_last_not_of(" \t\\") + 1);
     if (const std::size_t equals = whole.find('='); equals != std::string::npos) {
         entry.key = Linux::trimmed(std::string_view(whole).substr(0, equals));
         entry.value = Linux::trimmed(std::string_view(whole).substr(equals + 1));
@@ -126,7 +128,10 @@ void addWords(std::optional<std::vector<std::string>>& list, const std::string& 
         list.emplace();
     }
     for (const std::string_view word : Linux::wordsOf(value)) {
-        list->emplace_back(word);
+        // No address and no name has a backslash; at the end of a line it would take the next one in.
+        if (word.find('\\') == std::string_view::npos) {
+            list->emplace_back(word);
+        }
     }
 }
 

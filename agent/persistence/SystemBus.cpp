@@ -40,7 +40,7 @@ class Refusal {
     [[nodiscard]] std::string text() const { return cleanText(_error.message == nullptr ? "" : _error.message); }
 
   private:
-    sd_bus_error _error = SD_BUS_ERROR_NULL;
+    sd_bus_error _error{};
 };
 
 Message newCall(sd_bus* bus, const BusObject& object, const char* method) {

@@ -232,6 +232,7 @@ TEST(DescriptionEditor, EditsEveryFormInWhichATableIsWritten) {
         {"[[adapter]]\nidentity = \"\u00e9\u4e2d\"\ndns_domain = \"\u00e9\" # \u00e9\n", "x",
          "[[adapter]]\nidentity = \"\u00e9\u4e2d\"\ndns_domain = \"x\" # \u00e9\n"},
         {"\xEF\xBB\xBF[[adapter]]\ndns_domain = 'y'\n", "x", "\xEF\xBB\xBF[[adapter]]\ndns_domain = \"x\"\n"},
+        {"\xEF\xBB\xBF[[adapter]]\n", "x", "\xEF\xBB\xBF[[adapter]]\ndns_domain = \"x\"\n"},
         {"adapter = [{dhcp = 1}, {}]", "x", "adapter = [{ dhcp = 1, dns_domain = \"x\" }, {}]"},
         {"adapter = [{}] # c\n", "x", "adapter = [{ dns_domain = \"x\" }] # c\n"},
         {"adapter = [{dns_domain = 'y', dhcp=1}]", "x", "adapter = [{ dns_domain = \"x\", dhcp = 1 }]"},

@@ -172,6 +172,11 @@ TEST_F(IfupdownTest, RefusesAFormInWhichAnEditWouldBeLost) {
     EXPECT_THAT(refusal("iface eth0 inet static\\", fixedAt("10.0.0.1/8")), HasSubstr("cannot be edited"));
 }
 
+TEST_F(IfupdownTest, AddsAStanzaBehindALineThatGoesOn) {
+    EXPECT_EQ(planned("auto lo \\\n", leased()), "auto lo \\\n\nauto eth0\niface eth0 inet dhcp\n");
+    EXPECT_EQ(planned("auto lo \\", leased()), "auto lo \\\n\nauto eth0\niface eth0 inet dhcp\n");
+}
+
 TEST_F(IfupdownTest, KeepsNameServiceWhereTheStanzaHasIt) {
     const NameSettings wanted{"c.org", std::vector<std::string>{"192.0.2.53", "2001:db8::53"},
                               std::vector<std::string>{"a.org", "b.org"}};

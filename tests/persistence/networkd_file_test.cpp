@@ -42,6 +42,7 @@ TEST(NetworkdFile, ReadsTheSettingsThatCanBeChanged) {
         {"[Network]\nDomains=a.org ~b.org\n", "- - - - { \"a.org\", \"~b.org\" }"},
         {"# [Network]\n;DHCP=yes\n  [Network]  \n  DHCP  =  yes  \r\n", "yes - - - -"},
         {"[Network]\nDNS=10.0.0.1 \\\n# c\n  10.0.0.2\n", "- - - { \"10.0.0.1\", \"10.0.0.2\" } -"},
+        {"[Network]\nDNS=10.0.0.1 \\", "- - - { \"10.0.0.1\" } -"},
         {"[Network]\nnonsense\n=x\nDHCP", "- - - - -"},
         {"DHCP=yes\n", "- - - - -"},
     };

@@ -67,6 +67,9 @@ TEST(EditResolvConf, ChangesTheSettingsAndNothingElse) {
         {"search a\n",
          {"x.org", Texts{"10.0.0.1"}, Texts{"y.org"}},
          "domain x.org\nsearch y.org\nnameserver 10.0.0.1\n"},
+        {"nameserver 10.0.0.1\nsearch a\nsearch b",
+         {{}, Texts{"10.0.0.1", "10.0.0.2"}, Texts{"x.org"}},
+         "nameserver 10.0.0.1\nnameserver 10.0.0.2\nsearch x.org"},
         {"", {}, ""},
         {"search a\ndomain b\nsearch c", {}, "search a\ndomain b\nsearch c"},
     };
