@@ -63,7 +63,11 @@ class LinuxBackEnd : public BackEnd {
     }
 
     WriterParts writerParts() {
-        return {[this](const std::string& path) { return look(path); },
+        return {[this](const std::string& path) {
+                    const std::lock_guard lock(_mutex);
+                    return _tree.adapterAt(path);
+                },
+                [this](const std::string& path) { return look(path); },
                 [this](int index) {
                     const std::lock_guard lock(_mutex);
                     return _kernel.state().links().count(index) != 0;
@@ -80,7 +84,8 @@ class LinuxBackEnd : public BackEnd {
         if (!node || !index) {
             return std::nullopt;
         }
-        return AdapterFacts{_tree.facts(_kernel.state().links().at(*index)), node->properties};
+        const InterfaceFacts facts = _tree.facts(_kernel.state().links().at(*index));
+        return AdapterFacts{facts, node->properties, _configuration.modeOf(facts)};
     }
 
     std::mutex _mutex; ///< guards what follows, up to the writing parts

@@ -5,15 +5,16 @@
 
 namespace Orv::Agent::Linux {
 
-AdapterChange::AdapterChange(const WriterParts& parts, std::mutex& filesMutex, const InterfaceFacts& interface,
+AdapterChange::AdapterChange(const WriterParts& parts, std::mutex& filesMutex, const AdapterFacts& adapter,
                              const AdapterSettings& inForce, const AdapterSettings& wanted)
     : _parts(parts),
       _filesMutex(filesMutex),
-      _interface(interface),
+      _interface(adapter.interface),
+      _isConfiguredFixed(adapter.configured == AddressMode::fixed),
       _inForce(inForce),
       _wanted(wanted),
-      _manager(parts.manager(interface)),
-      _nameService(wanted.names.none() ? nullptr : parts.nameService(interface)) {}
+      _manager(parts.manager(adapter.interface)),
+      _nameService(wanted.names.none() ? nullptr : parts.nameService(adapter.interface)) {}
 
 void AdapterChange::make() {
     try {
@@ -28,13 +29,11 @@ void AdapterChange::make() {
 }
 
 void AdapterChange::makeSteps() {
-    // Looking for clients takes a look at every process: only where there may be one, or the mode was asked for.
-    if (goesTo(AddressMode::fixed) && (_inForce.ipv4->mode == AddressMode::leased || _wanted.ipv4 == _inForce.ipv4)) {
+    if (goesTo(AddressMode::fixed) && mayHaveClient()) {
         stopClient();
     }
     editFiles();
-    // A lease stays where DHCP is switched on once more.
-    if (_wanted.ipv4 && !(goesTo(AddressMode::leased) && _inForce.ipv4->mode == AddressMode::leased)) {
+    if (concernsKernel()) {
         changeKernel();
     }
     _manager->activate(_interface, _wanted);
@@ -44,6 +43,21 @@ void AdapterChange::makeSteps() {
     if (goesTo(AddressMode::leased)) {
         startClient();
     }
+}
+
+/** Whether to look for a DHCP client, which takes a look at every process of the host. */
+bool AdapterChange::mayHaveClient() const {
+    const Ipv4Settings& inForce = *_inForce.ipv4;
+    const bool isFixed = _isConfiguredFixed && inForce.mode == AddressMode::fixed && inForce.address;
+    // With only the mode in it, a change leaves everything else as it is.
+    const bool isModeAlone = _wanted.ipv4 == inForce;
+    return inForce.mode == AddressMode::leased || (isModeAlone && !isFixed);
+}
+
+bool AdapterChange::concernsKernel() const {
+    // A lease stays where DHCP is switched on once more.
+    const bool isLeasedAlready = goesTo(AddressMode::leased) && _inForce.ipv4->mode == AddressMode::leased;
+    return _wanted.ipv4 && _wanted.ipv4 != _inForce.ipv4 && !isLeasedAlready;
 }
 
 Persistence::FileEdits AdapterChange::plan(const AdapterSettings& settings) const {

@@ -22,7 +22,7 @@ namespace Orv::Agent::Linux {
  */
 class AdapterChange {
   public:
-    AdapterChange(const WriterParts& parts, std::mutex& filesMutex, const InterfaceFacts& interface,
+    AdapterChange(const WriterParts& parts, std::mutex& filesMutex, const AdapterFacts& adapter,
                   const AdapterSettings& inForce, const AdapterSettings& wanted);
 
     /** Throws std::exception after having put everything back; the text says so where that failed. */
@@ -38,11 +38,15 @@ class AdapterChange {
     void startClient();
     [[nodiscard]] Persistence::FileEdits plan(const AdapterSettings& settings) const;
 
+    [[nodiscard]] bool mayHaveClient() const;
+    [[nodiscard]] bool concernsKernel() const;
+
     [[nodiscard]] bool goesTo(AddressMode mode) const { return _wanted.ipv4 && _wanted.ipv4->mode == mode; }
 
     const WriterParts& _parts;
     std::mutex& _filesMutex;
     const InterfaceFacts& _interface;
+    const bool _isConfiguredFixed;
     const AdapterSettings& _inForce;
     const AdapterSettings& _wanted;
     const std::unique_ptr<Persistence::Manager> _manager;

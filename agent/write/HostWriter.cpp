@@ -20,23 +20,21 @@ std::shared_ptr<HostWriter::Slot> HostWriter::slotOf(int index) {
 }
 
 void HostWriter::write(const std::string& path, NodeLexicon::Properties property, const PropertyValue& value) {
-    const auto look = [&] {
-        std::optional<AdapterFacts> adapter = _parts.look(path);
-        if (!adapter) {
-            throw ChangeError(path, property, value, "there is no such adapter");
-        }
-        return *std::move(adapter);
-    };
-    const std::shared_ptr<Slot> slot = slotOf(look().interface.index);
+    const std::optional<int> index = _parts.find(path);
+    const std::shared_ptr<Slot> slot = index ? slotOf(*index) : std::make_shared<Slot>();
     const std::lock_guard lock(slot->mutex);
-    // Again, because writes that this one waited for have changed it.
-    const AdapterFacts adapter = look();
+    // Only now, because writes that this one waited for have changed it.
+    const std::optional<AdapterFacts> found = _parts.look(path);
+    if (!found) {
+        throw ChangeError(path, property, value, "there is no such adapter");
+    }
+    const AdapterFacts& adapter = *found;
     const std::string& name = adapter.interface.name;
     const AdapterSettings inForce = settingsOf(adapter.properties);
     const Resolution resolution = resolve(name, property, value, inForce, slot->pending);
     if (resolution.wanted.ipv4 || !resolution.wanted.names.none()) {
         try {
-            AdapterChange(_parts, _filesMutex, adapter.interface, inForce, resolution.wanted).make();
+            AdapterChange(_parts, _filesMutex, adapter, inForce, resolution.wanted).make();
         } catch (const std::exception& failure) {
             throw ChangeError(name, property, value, failure.what());
         }

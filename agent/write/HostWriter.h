@@ -22,10 +22,14 @@ namespace Orv::Agent::Linux {
 struct AdapterFacts {
     InterfaceFacts interface;
     PropertyMap properties;
+    std::optional<AddressMode> configured; ///< what the host's files say about it
 };
 
 /** What writing stands on. Every function may be called from any thread. */
 struct WriterParts {
+    /** The index of the interface whose adapter had this path when the tree was last looked at. */
+    std::function<std::optional<int>(const std::string& path)> find;
+
     /** The adapter at a path of the tree as it is at this moment; none when there is no adapter there. */
     std::function<std::optional<AdapterFacts>(const std::string& path)> look;
 

@@ -48,6 +48,22 @@ class ConfigurationSchema final : public broker::SchemaView {
     std::vector<std::string> _keys{"SettingID"};
 };
 
+/** What the factory of this name in the provider library makes. */
+template <typename MI>
+MI* createMI(const char* name) {
+    void* library = ::dlopen(MARLO_PROVIDER_LIBRARY, RTLD_NOW | RTLD_LOCAL);
+    if (library == nullptr) {
+        throw std::runtime_error(::dlerror());
+    }
+    using Factory = MI* (*)(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
+    const auto factory = reinterpret_cast<Factory>(::dlsym(library, name));
+    if (factory == nullptr) {
+        throw std::runtime_error(::dlerror());
+    }
+    CMPIStatus status{CMPI_RC_OK, nullptr};
+    return factory(sharedBroker().handle(), nullptr, &status);
+}
+
 } // namespace
 
 const broker::Broker& sharedBroker() {
@@ -57,17 +73,11 @@ const broker::Broker& sharedBroker() {
 }
 
 CMPIInstanceMI* configurationProvider() {
-    void* library = ::dlopen(MARLO_PROVIDER_LIBRARY, RTLD_NOW | RTLD_LOCAL);
-    if (library == nullptr) {
-        throw std::runtime_error(::dlerror());
-    }
-    using Factory = CMPIInstanceMI* (*)(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
-    const auto factory = reinterpret_cast<Factory>(::dlsym(library, "NetworkAdapterProvider_Create_InstanceMI"));
-    if (factory == nullptr) {
-        throw std::runtime_error(::dlerror());
-    }
-    CMPIStatus status{CMPI_RC_OK, nullptr};
-    return factory(sharedBroker().handle(), nullptr, &status);
+    return createMI<CMPIInstanceMI>("NetworkAdapterProvider_Create_InstanceMI");
+}
+
+CMPIMethodMI* configurationMethods() {
+    return createMI<CMPIMethodMI>("NetworkAdapterProvider_Create_MethodMI");
 }
 
 } // namespace marlo::bench

@@ -19,6 +19,9 @@ const broker::Broker& sharedBroker();
 /** The instance MI of the configuration provider, loaded as an object manager loads it. */
 CMPIInstanceMI* configurationProvider();
 
+/** Its method MI. */
+CMPIMethodMI* configurationMethods();
+
 /** Counts what is returned and keeps nothing. */
 class CountingSink final : public broker::ResultSink {
   public:

@@ -185,11 +185,16 @@ inline void ScriptedHost::add(int index, const std::string& name, unsigned mode,
         }
     }
     const std::lock_guard lock(mutex);
-    adapters[name] = {{index, name, "", "", "", true}, properties};
+    adapters[name] = {{index, name, "", "", "", true}, properties, {}};
 }
 
 inline Agent::Linux::WriterParts ScriptedHost::parts() {
-    return {[this](const std::string& path) -> std::optional<Agent::Linux::AdapterFacts> {
+    return {[this](const std::string& path) -> std::optional<int> {
+                const std::lock_guard lock(mutex);
+                const auto found = adapters.find(path);
+                return found == adapters.end() ? std::nullopt : std::optional(found->second.interface.index);
+            },
+            [this](const std::string& path) -> std::optional<Agent::Linux::AdapterFacts> {
                 const std::lock_guard lock(mutex);
                 const auto found = adapters.find(path);
                 return found == adapters.end() ? std::nullopt : std::optional(found->second);

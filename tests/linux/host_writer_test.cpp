@@ -57,6 +57,18 @@ TEST_F(HostWriterTest, endsTheClientBeforeItMakesALeaseLast) {
     EXPECT_THAT(host.clients, IsEmpty());
 }
 
+TEST_F(HostWriterTest, looksForNoClientWhereFilesAndKernelSayStatic) {
+    writer.write("eth0", PROP_DHCP_ENABLED, fixed);
+    EXPECT_THAT(host.takeSteps(), testing::Contains("stop eth0"));
+    host.adapters["eth0"].configured = AddressMode::fixed;
+    writer.write("eth0", PROP_DHCP_ENABLED, fixed);
+    EXPECT_THAT(host.takeSteps(), testing::Not(testing::Contains("stop eth0")));
+    host.add(4, "eth2", fixed, "", "", "");
+    host.adapters["eth2"].configured = AddressMode::fixed;
+    writer.write("eth2", PROP_DHCP_ENABLED, fixed);
+    EXPECT_THAT(host.takeSteps(), testing::Contains("stop eth2"));
+}
+
 TEST_F(HostWriterTest, startsTheClientWhenEverythingElseIsDone) {
     writer.write("eth0", PROP_DHCP_ENABLED, dhcp);
     EXPECT_THAT(host.takeSteps(),
