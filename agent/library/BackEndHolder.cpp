@@ -3,11 +3,13 @@
 #include "agent/config/Configuration.h"
 #include "agent/file/FileBackEnd.h"
 #include "agent/library/Log.h"
+#include "agent/library/PerProcess.h"
 #include "agent/linux/LinuxBackEnd.h"
 
-#include <atomic>
-#include <mutex>
+#include <memory>
 #include <utility>
+
+#include <pthread.h>
 
 namespace Orv::Agent {
 
@@ -26,20 +28,15 @@ std::unique_ptr<BackEnd> makeBackEnd(const Configuration& configuration) {
 } // namespace
 
 BackEnd& processBackEnd() {
-    static std::mutex mutex;
-    static std::atomic<BackEnd*> backEnd{nullptr};
-    if (BackEnd* present = backEnd.load(std::memory_order_acquire)) {
-        return *present;
-    }
-    const std::lock_guard lock(mutex);
-    if (BackEnd* present = backEnd.load(std::memory_order_acquire)) {
-        return *present;
-    }
-    const Configuration configuration = loadConfiguration();
-    Log::instance().configure(configuration);
-    BackEnd* made = makeBackEnd(configuration).release();
-    backEnd.store(made, std::memory_order_release);
-    return *made;
+    static PerProcess<BackEnd> backEnd;
+    static const int registered =
+        ::pthread_atfork([] { backEnd.beforeFork(); }, [] { backEnd.inParent(); }, [] { backEnd.inChild(); });
+    static_cast<void>(registered); // without memory for it, forked processes share their parent's back end
+    return backEnd.get([] {
+        const Configuration configuration = loadConfiguration();
+        Log::instance().configure(configuration);
+        return makeBackEnd(configuration);
+    });
 }
 
 void reportFailure(const char* function, const char* text) noexcept {

@@ -12,7 +12,7 @@ namespace Orv::Agent {
 
 /**
  * The back end that the configuration names, made by the first call; it lives as long as the process, because threads
- * of an object manager may still read when static objects are destroyed.
+ * of an object manager may still read when static objects are destroyed. A forked process makes one of its own.
  *
  * Throws std::exception when the configuration is wrong or the back end cannot be made; the next call tries again.
  * May be called from any thread; costs one atomic read once the back end is there.

@@ -2,10 +2,13 @@
 
 #include "agent/library/BackEndHolder.h"
 #include "agent/library/Log.h"
+#include "agent/library/PerProcess.h"
 
 #include <ctime>
 #include <memory>
 #include <string>
+
+#include <pthread.h>
 
 namespace Orv::Agent {
 
@@ -20,9 +23,12 @@ void report(int level, const std::string& text) {
 } // namespace
 
 Monitor& processMonitor() {
-    // Never destroyed: its thread runs until the process ends, whatever static objects are gone by then.
-    static Monitor* const monitor = std::make_unique<Monitor>(processBackEnd(), report).release();
-    return *monitor;
+    BackEnd& backEnd = processBackEnd();
+    static PerProcess<Monitor> monitor;
+    static const int registered =
+        ::pthread_atfork([] { monitor.beforeFork(); }, [] { monitor.inParent(); }, [] { monitor.inChild(); });
+    static_cast<void>(registered);
+    return monitor.get([&] { return std::make_unique<Monitor>(backEnd, report); });
 }
 
 DateTime::Fields localTime(std::chrono::system_clock::time_point time) {

@@ -92,6 +92,16 @@ TEST_F(ProcessTest, KeepsFailuresOnTheStandardErrorStreamAndNoTraceByDefault) {
     EXPECT_THAT(outcome.errors, Not(HasSubstr("a trace line")));
 }
 
+/** A daemon that goes into the background leaves the threads of the library behind. */
+TEST_F(ProcessTest, MonitorsInAForkedProcessToo) {
+    // ThreadSanitizer wants to be told that threads after a fork are meant.
+    const Outcome outcome =
+        probe("TSAN_OPTIONS=die_after_fork=0 " + configured("") + " ORV_AGENT_TREE='" + tree.path() + "'",
+              "watch 12 fork watch 5");
+    EXPECT_EQ(outcome.exitCode, 0) << outcome.errors;
+    EXPECT_EQ(outcome.output, "event: 12\nevent: 5\n");
+}
+
 TEST_F(ProcessTest, ExportsItsInterfaceAndNothingElse) {
     const std::string command =
         "nm -D --defined-only -C '" AGENT_LIBRARY "' >'" + (files.directory() / "names").string() + "'";

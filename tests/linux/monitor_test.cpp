@@ -1,5 +1,6 @@
 #include "tests/linux/MonitorFixture.h"
 
+#include <algorithm>
 #include <atomic>
 #include <filesystem>
 #include <iterator>
@@ -13,7 +14,6 @@ namespace {
 
 using namespace NodeLexicon;
 using namespace Orv::Test;
-using testing::Contains;
 using testing::Each;
 
 class LinuxMonitorTest : public MonitorFixture {
@@ -72,7 +72,11 @@ TEST_F(LinuxMonitorTest, reportsARenameUnderTheNewNameAndWithAnotherCode) {
     space->ip("link set left name wrong");
     space->ip("link set wrong name uplink");
     expectEvents("left", {5});
-    EXPECT_THAT(reader->ignored.await(2), Contains(EventCode::name).Times(2));
+    const auto renames = [&] {
+        const auto codes = reader->ignored.now(); // addresses that the link takes with it are among them
+        return std::count(codes.begin(), codes.end(), EventCode::name);
+    };
+    EXPECT_EQ(awaited(std::ptrdiff_t{2}, renames), 2);
     space->ip("link set uplink up");
     expectStatus("uplink", 1);
     expectAgreementWithIpMonitor();
@@ -82,7 +86,7 @@ TEST_F(LinuxMonitorTest, reportsARenameUnderTheNewNameAndWithAnotherCode) {
 TEST_F(LinuxMonitorTest, reportsAddressesWithAnotherCode) {
     startWithAPair();
     space->ip("addr add 192.0.2.10/24 dev left");
-    EXPECT_THAT(reader->ignored.await(1), Contains(EventCode::address));
+    EXPECT_THAT(reader->ignored.await(1), Each(EventCode::address));
     const std::size_t count = reader->ignored.now().size();
     space->ip("link set right address 02:00:00:00:00:0b");
     EXPECT_GT(reader->ignored.await(count + 1).size(), count);
