@@ -4,7 +4,7 @@
 #include "agent/linux/Selection.h"
 #include "agent/text/Text.h"
 
-#include <algorithm>
+#include <charconv>
 #include <exception>
 #include <utility>
 
@@ -67,10 +67,14 @@ Tree::NodePointer HostTree::adapter(int index) const {
 }
 
 std::optional<int> HostTree::adapterAt(const std::string& path) const {
-    const auto found = std::find_if(_interfaces.begin(), _interfaces.end(), [&](const auto& known) {
-        return known.second.adapter && known.second.adapter->path == path;
-    });
-    return found == _interfaces.end() ? std::nullopt : std::optional(found->first);
+    // The path ends in the index.
+    const char* const end = path.data() + path.size();
+    int index = 0;
+    if (std::from_chars(path.data() + path.rfind('/') + 1, end, index).ptr != end) {
+        return std::nullopt;
+    }
+    const NodePointer node = adapter(index);
+    return node && node->path == path ? std::optional(index) : std::nullopt;
 }
 
 InterfaceFacts HostTree::facts(const Link& link) const {

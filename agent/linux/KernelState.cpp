@@ -105,7 +105,7 @@ void KernelState::applyAddress(const Change<Address>& change) {
             return;
         }
         addresses.erase(known);
-        markRoutesStale();
+        _staleRoutes.at(familySlot(address.local.family)) = true;
     } else if (known == addresses.end()) {
         insert(addresses, address);
     } else if (*known == address) {

@@ -72,6 +72,7 @@ void exchange(AddressPlan& plan, const InterfaceTables& before, const std::vecto
     AddressObject standIn(before.index, fresh.local(), hostPrefix, 0);
     const bool needsStandIn = sharesNetworkWithAny(leaving, fresh);
     const bool standsAlready = findSame(before.addresses, standIn) != nullptr;
+    plan.isGapless = !standsAlready;
     if (!needsStandIn) {
         addStep(plan.steps, fresh);
     } else if (!standsAlready) {
@@ -88,7 +89,7 @@ void exchange(AddressPlan& plan, const InterfaceTables& before, const std::vecto
 
 /** Has the address that stands for the interface already stay for good. */
 AddressPlan keep(const InterfaceTables& before, std::size_t place) {
-    AddressPlan plan{{}, before.addresses};
+    AddressPlan plan{{}, before.addresses, true};
     AddressObject& present = plan.result[place];
     if (!present.isPermanent()) {
         present.makePermanent();
@@ -125,6 +126,7 @@ AddressPlan exchangeFor(const InterfaceTables& before, const AddressObject* fres
         plan.result.push_back(*fresh);
     } else {
         removeAll(plan.steps, leaving);
+        plan.isGapless = false;
     }
     for (const AddressObject& address : returning) {
         addStep(plan.steps, address);
@@ -154,7 +156,7 @@ AddressPlan planLeaseFirst(const InterfaceTables& before) {
     const auto lease = std::find_if(before.addresses.begin(), before.addresses.end(),
                                     [](const AddressObject& address) { return !address.isPermanent(); });
     if (lease == before.addresses.end() || &*lease == &before.addresses[*reportedAddress(before)]) {
-        return {{}, before.addresses};
+        return {{}, before.addresses, true};
     }
     return exchangeFor(before, &*lease, nullptr, false);
 }

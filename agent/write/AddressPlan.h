@@ -16,6 +16,7 @@ namespace Orv::Agent::Linux {
 struct AddressPlan {
     ChangeBatch steps;
     std::vector<AddressObject> result; ///< in the kernel's order
+    bool isGapless = true;             ///< the interface is never without an address on the way
 };
 
 /**

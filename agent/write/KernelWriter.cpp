@@ -235,7 +235,11 @@ InterfaceTables KernelWriter::write(const InterfaceTables& before, const Ipv4Set
     }
     // Whatever is to be removed may be gone by itself, as a default route with the old address.
     apply(std::move(plan.steps), {ESRCH, EADDRNOTAVAIL});
-    if (!expected.addresses.empty() && !expected.routes.empty()) {
+    // While there is an address, the kernel drops the routes alone whose source is one that leaves.
+    const bool mayHaveLost =
+        !plan.isGapless || std::any_of(before.routes.begin(), before.routes.end(),
+                                       [](const RouteObject& route) { return !!route.source(); });
+    if (mayHaveLost && !expected.addresses.empty()) {
         putBackRoutes(expected, read(before.index), old);
     }
     return expected;

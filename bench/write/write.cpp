@@ -150,12 +150,24 @@ std::string addressOf(int round) {
     return round % 2 == 0 ? "10.0.0.20" : "10.0.0.30";
 }
 
-/** Microseconds. */
+/** Microseconds: medians of the wall clock, and the processor's time on average, the kernel's part included. */
 struct Cost {
     double method = 0; ///< without `sync`
     double sync = 0;
     double programs = 0; ///< the two of ip
+    double methodProcessor = 0;
+    double programsProcessor = 0;
 };
+
+/** Of this process or of those that it has waited for. */
+double processorTime(int who) {
+    rusage usage{};
+    getrusage(who, &usage);
+    const auto microseconds = [](const timeval& time) {
+        return 1e6 * static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec);
+    };
+    return microseconds(usage.ru_utime) + microseconds(usage.ru_stime);
+}
 
 Cost measure(const std::string& directory, int interfaces, int rounds) {
     makeHost(interfaces, directory);
@@ -164,11 +176,15 @@ Cost measure(const std::string& directory, int interfaces, int rounds) {
     std::vector<double> method;
     std::vector<double> sync;
     std::vector<double> programs;
+    double processor = 0;
+    const double programsBefore = processorTime(RUSAGE_CHILDREN);
     for (int round = 0; round < rounds; ++round) {
         (void)bench::takeSyncTime();
+        const double processorBefore = processorTime(RUSAGE_SELF);
         double start = now();
         enableStatic(addressOf(round));
         const double whole = now() - start;
+        processor += processorTime(RUSAGE_SELF) - processorBefore;
         sync.push_back(bench::takeSyncTime());
         method.push_back(whole - sync.back());
         start = now();
@@ -176,7 +192,8 @@ Cost measure(const std::string& directory, int interfaces, int rounds) {
         run({"ip", "route", "replace", "default", "via", "10.0.1.1", "dev", "left1", "metric", "9"});
         programs.push_back(now() - start);
     }
-    return {median(method), median(sync), median(programs)};
+    return {median(method), median(sync), median(programs), processor / rounds,
+            (processorTime(RUSAGE_CHILDREN) - programsBefore) / rounds};
 }
 
 /** The memory of this process in KiB: all that is resident, and what is in use on the heap. */
@@ -254,8 +271,10 @@ int main(int count, char** arguments) {
         for (const int interfaces : {4, 64, 1000}) {
             inChild([&](const std::string& directory) {
                 const Cost cost = measure(directory, interfaces, rounds);
-                std::printf("  %8d interfaces %10.0f method %10.0f fsync apart %10.0f ip addr and route replace\n",
-                            interfaces, cost.method, cost.sync, cost.programs);
+                std::printf("  %8d interfaces %8.0f method %8.0f fsync apart %8.0f ip addr and route replace; "
+                            "of CPU %8.0f method %8.0f ip\n",
+                            interfaces, cost.method, cost.sync, cost.programs, cost.methodProcessor,
+                            cost.programsProcessor);
             });
         }
         inChild([&](const std::string& directory) { measureMemory(directory, changes); });
