@@ -104,6 +104,7 @@ TEST_F(Restart, ScriptThatPrintsWithoutEndIsEndedAndNotWaitedForInVain) {
 }
 
 TEST_F(Restart, WithoutAFileDescriptorForThePipeIsASuccessThatIsLogged) {
+    ASSERT_NE(library(), nullptr) << "it is loaded while files can still be opened";
     rlimit before{};
     ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &before), 0);
     const rlimit none{0, before.rlim_max};
