@@ -13,7 +13,9 @@ void requireOrder(const InterfacesFile& file) {
         require(statement.begin >= end && statement.end > statement.begin, "statements follow one another");
         end = statement.end;
         std::size_t place = statement.begin;
-        for (const auto& word : statement.words) {
+        const auto words = file.wordsOf(statement);
+        require(words.front().text == statement.keyword, "a keyword is the first word");
+        for (const auto& word : words) {
             require(word.begin >= place && word.end >= word.begin && word.end <= end, "words lie in their statement");
             place = word.end;
         }
@@ -22,7 +24,7 @@ void requireOrder(const InterfacesFile& file) {
 }
 
 bool isIpv4Stanza(const InterfacesFile& file, const InterfacesFile::Stanza& stanza) {
-    const auto& words = file.header(stanza).words;
+    const auto words = file.wordsOf(file.header(stanza));
     return words.front().text == "iface" && words.size() >= 4 && words[2].text == "inet";
 }
 

@@ -20,12 +20,12 @@ using Place = InterfacesFiles::Place;
 constexpr std::array<std::string_view, 4> editableMethods{"static", "dhcp", "bootp", "manual"};
 
 /** iface NAME FAMILY METHOD ... */
-bool isStanzaOf(const Place& place, const std::string& interface) {
-    return place.keyword() == "iface" && place.words().size() >= 4 && place.words()[1].text == interface;
-}
-
 bool isIpv4StanzaOf(const Place& place, const std::string& interface) {
-    return isStanzaOf(place, interface) && place.words()[2].text == "inet";
+    if (place.keyword() != "iface") {
+        return false;
+    }
+    const auto words = place.words();
+    return words.size() >= 4 && words[1].text == interface && words[2].text == "inet";
 }
 
 bool isSelection(const Place& place) {
@@ -45,20 +45,25 @@ bool selects(std::string word, const std::string& interface) {
 template <typename Predicate>
 bool anySelection(const InterfacesFiles& files, const std::string& interface, Predicate predicate) {
     return std::any_of(files.stanzas().begin(), files.stanzas().end(), [&](const Place& place) {
-        return isSelection(place) &&
-               std::any_of(place.words().begin() + 1, place.words().end(), [&](const InterfacesFile::Word& word) {
-                   return selects(word.text, interface) && predicate(word.text);
-               });
+        if (!isSelection(place)) {
+            return false;
+        }
+        const auto words = place.words();
+        return std::any_of(words.begin() + 1, words.end(), [&](const InterfacesFile::Word& word) {
+            return selects(word.text, interface) && predicate(word.text);
+        });
     });
 }
 
 void refuseIndirection(const InterfacesFiles& files, const std::string& interface) {
     for (const Place& place : files.stanzas()) {
-        const auto& words = place.words();
-        const bool maps = place.keyword() == "mapping" &&
-                          std::any_of(words.begin() + 1, words.end(), [&](const InterfacesFile::Word& word) {
-                              return fnmatch(word.text.c_str(), interface.c_str(), 0) == 0;
-                          });
+        if (place.keyword() != "mapping") {
+            continue;
+        }
+        const auto words = place.words();
+        const bool maps = std::any_of(words.begin() + 1, words.end(), [&](const InterfacesFile::Word& word) {
+            return fnmatch(word.text.c_str(), interface.c_str(), 0) == 0;
+        });
         if (maps) {
             throw std::runtime_error(place.file->path + ": a script chooses its configuration (\"mapping\")");
         }
@@ -71,20 +76,21 @@ void refuseIndirection(const InterfacesFiles& files, const std::string& interfac
 /** The stanza to edit; null when there is none. */
 const Place* stanzaOf(const InterfacesFiles& files, const std::string& interface) {
     const Place* found = nullptr;
+    std::string method = "manual";
     for (const Place& place : files.stanzas()) {
-        const bool isFirst = found == nullptr || found->words()[3].text == "manual";
-        if (isIpv4StanzaOf(place, interface) && isFirst && (found == nullptr || place.words()[3].text != "manual")) {
+        if (method != "manual" || !isIpv4StanzaOf(place, interface)) {
+            continue;
+        }
+        std::string candidate = place.words()[3].text;
+        if (found == nullptr || candidate != "manual") {
             found = &place;
+            method = std::move(candidate);
         }
     }
-    if (found == nullptr) {
-        return nullptr;
-    }
-    const std::string& method = found->words()[3].text;
     if (std::find(editableMethods.begin(), editableMethods.end(), method) == editableMethods.end()) {
         throw std::runtime_error(found->file->path + ": its method is \"" + method + "\", which cannot be edited");
     }
-    if (found->words().size() > 4) {
+    if (found != nullptr && found->words().size() > 4) {
         throw std::runtime_error(found->file->path + ": its stanza inherits from another");
     }
     return found;
@@ -100,7 +106,7 @@ bool readsNames(const Environment& environment) {
 /** Interfaces that are there from the beginning are brought up when they are found, where the files do it so. */
 std::string selectionFor(const InterfacesFiles& files, const InterfaceFacts& interface) {
     const auto selecting = std::find_if(files.stanzas().begin(), files.stanzas().end(), [](const Place& place) {
-        return isSelection(place) && !(place.words().size() == 2 && place.words()[1].text == "lo");
+        return isSelection(place) && place.file->content.valueOf(place.file->content.header(*place.stanza)) != "lo";
     });
     const bool isHotplug = selecting != files.stanzas().end() && selecting->keyword() == "allow-hotplug";
     return isHotplug && interface.kind.empty() ? "allow-hotplug " : "auto ";
@@ -148,7 +154,11 @@ FileEdits Ifupdown::plan(const InterfaceFacts& interface, const AdapterSettings&
 bool Ifupdown::knows(const InterfaceFacts& interface, const Environment& environment) {
     const InterfacesFiles files(environment.root);
     return std::any_of(files.stanzas().begin(), files.stanzas().end(), [&](const Place& place) {
-        return place.keyword() == "iface" && place.words().size() >= 2 && place.words()[1].text == interface.name;
+        if (place.keyword() != "iface") {
+            return false;
+        }
+        const auto words = place.words();
+        return words.size() >= 2 && words[1].text == interface.name;
     });
 }
 

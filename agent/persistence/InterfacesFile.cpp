@@ -12,7 +12,7 @@ constexpr std::array<std::string_view, 8> openers{"iface",      "mapping", "auto
                                                   "no-scripts", "rename",  "source", "source-directory"};
 
 bool isBlank(char character) {
-    return blanks.find(character) != std::string_view::npos;
+    return character == ' ' || (character >= '\t' && character <= '\r' && character != '\n');
 }
 
 bool opensStanza(std::string_view keyword) {
@@ -24,29 +24,67 @@ bool continues(std::string_view text, std::size_t place) {
     return text[place] == '\\' && place + 1 < text.size() && text[place + 1] == '\n';
 }
 
+/** Appends a word with a piece that stands behind it, or begins one. */
+void addPiece(std::vector<InterfacesFile::Word>& words, std::string_view text, std::size_t begin, std::size_t end,
+              bool goesOn) {
+    if (!goesOn) {
+        words.push_back({begin, end, {}});
+    }
+    words.back().text += text.substr(begin, end - begin);
+    words.back().end = end;
+}
+
 std::vector<InterfacesFile::Word> wordsIn(std::string_view text, std::size_t begin, std::size_t end) {
     std::vector<InterfacesFile::Word> words;
-    bool isInWord = false;
-    for (std::size_t place = begin; place < end; ++place) {
+    words.reserve(4);
+    bool goesOn = false; // the next piece belongs to the word before
+    for (std::size_t place = begin; place < end;) {
         if (continues(text, place)) {
-            ++place; // the next line goes on in the same word
+            place += 2;
         } else if (isBlank(text[place]) || text[place] == '\n') {
-            isInWord = false;
+            goesOn = false;
+            ++place;
         } else {
-            if (!isInWord) {
-                words.push_back({place, place, {}});
+            const std::size_t first = place;
+            while (place < end && !isBlank(text[place]) && text[place] != '\n' && !continues(text, place)) {
+                ++place;
             }
-            isInWord = true;
-            words.back().text += text[place];
-            words.back().end = place + 1;
+            addPiece(words, text, first, place, goesOn);
+            goesOn = true;
         }
     }
     return words;
 }
 
+/** As the first of wordsIn; empty when there is none. */
+std::string firstWord(std::string_view text, std::size_t begin, std::size_t end) {
+    std::size_t first = begin;
+    while (first < end && isBlank(text[first])) {
+        ++first;
+    }
+    std::size_t behind = first;
+    while (behind < end && !isBlank(text[behind]) && text[behind] != '\n' && text[behind] != '\\') {
+        ++behind;
+    }
+    if (behind < end && text[behind] == '\\') {
+        const auto words = wordsIn(text, begin, end); // the word may go on in the next line
+        return words.empty() ? "" : words.front().text;
+    }
+    return std::string(text.substr(first, behind - first));
+}
+
 } // namespace
 
-std::string InterfacesFile::Statement::value() const {
+std::vector<InterfacesFile::Word> InterfacesFile::wordsOf(const Statement& statement) const {
+    std::vector<Word> words = wordsIn(_text, statement.begin, statement.end);
+    if (words.empty()) {
+        words.push_back({statement.begin, statement.begin, {}}); // nothing but continuations
+    }
+    return words;
+}
+
+std::string InterfacesFile::valueOf(const Statement& statement) const {
+    const std::vector<Word> words = wordsOf(statement);
     std::string value;
     for (auto word = words.begin() + 1; word != words.end(); ++word) {
         value += (value.empty() ? "" : " ") + word->text;
@@ -76,12 +114,9 @@ void InterfacesFile::readStatement(std::size_t begin) {
     while (end >= begin + 2 && end < _text.size() && continues(_text, end - 2)) {
         end = lineEnd(end);
     }
-    Statement statement{begin, end, wordsIn(_text, begin, end)};
-    if (statement.words.empty()) {
-        statement.words.push_back({begin, begin, {}}); // nothing but continuations
-    }
+    Statement statement{begin, end, firstWord(_text, begin, end)};
     const std::size_t number = _statements.size();
-    if (opensStanza(statement.keyword())) {
+    if (opensStanza(statement.keyword)) {
         _stanzas.push_back({number, number + 1});
     } else if (!_stanzas.empty()) {
         _stanzas.back().end = number + 1;
@@ -97,7 +132,7 @@ std::string InterfacesFile::newline() const {
 std::string InterfacesFile::indentation(const Stanza& stanza) const {
     const auto indentationOf = [&](const Stanza& candidate) {
         const Statement& option = _statements[candidate.header + 1];
-        return _text.substr(option.begin, option.words.front().begin - option.begin);
+        return _text.substr(option.begin, wordsOf(option).front().begin - option.begin);
     };
     if (stanza.end > stanza.header + 1) {
         return indentationOf(stanza);
@@ -110,7 +145,7 @@ std::string InterfacesFile::indentation(const Stanza& stanza) const {
 std::vector<const StanzaEditor::Statement*> StanzaEditor::find(std::string_view option) const {
     std::vector<const Statement*> found;
     for (std::size_t number = _stanza.header + 1; number < _stanza.end; ++number) {
-        if (_file.statements()[number].keyword() == option) {
+        if (_file.statements()[number].keyword == option) {
             found.push_back(&_file.statements()[number]);
         }
     }
@@ -119,11 +154,11 @@ std::vector<const StanzaEditor::Statement*> StanzaEditor::find(std::string_view 
 
 std::optional<std::string> StanzaEditor::value(std::string_view option) const {
     const auto found = find(option);
-    return found.empty() ? std::nullopt : std::optional(found.front()->value());
+    return found.empty() ? std::nullopt : std::optional(_file.valueOf(*found.front()));
 }
 
 void StanzaEditor::setHeaderWord(std::size_t number, const std::string& text) {
-    const InterfacesFile::Word& word = _file.header(_stanza).words[number];
+    const InterfacesFile::Word word = _file.wordsOf(_file.header(_stanza)).at(number);
     if (word.text != text) {
         _edit.replace(word.begin, word.end, text);
     }
@@ -142,17 +177,17 @@ void StanzaEditor::set(std::string_view option, const std::string& value,
         std::size_t behind = _stanza.header;
         for (std::size_t number = _stanza.header + 1; number < _stanza.end; ++number) {
             const bool isAnchor =
-                std::find(after.begin(), after.end(), _file.statements()[number].keyword()) != after.end();
+                std::find(after.begin(), after.end(), _file.statements()[number].keyword) != after.end();
             behind = isAnchor ? number : behind;
         }
         insertBehind(_file.statements()[behind], option, value);
         return;
     }
-    const Statement& first = *found.front();
-    if (first.words.size() == 1) {
-        _edit.insert(first.words.front().end, " " + value);
-    } else if (first.value() != value) {
-        _edit.replace(first.words[1].begin, first.words.back().end, value);
+    const std::vector<InterfacesFile::Word> words = _file.wordsOf(*found.front());
+    if (words.size() == 1) {
+        _edit.insert(words.front().end, " " + value);
+    } else if (_file.valueOf(*found.front()) != value) {
+        _edit.replace(words[1].begin, words.back().end, value);
     }
     std::for_each(found.begin() + 1, found.end(),
                   [&](const Statement* other) { _edit.remove(other->begin, other->end); });

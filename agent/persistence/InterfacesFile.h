@@ -24,16 +24,11 @@ class InterfacesFile {
         std::string text;
     };
 
-    /** A line that says something, with the lines that continue it; it has a word at least. */
+    /** A line that says something, with the lines that continue it. */
     struct Statement {
-        std::size_t begin; ///< of its first line
-        std::size_t end;   ///< behind the end of its last line
-        std::vector<Word> words;
-
-        [[nodiscard]] const std::string& keyword() const { return words.front().text; }
-
-        /** The words behind the first, with a blank between each. */
-        [[nodiscard]] std::string value() const;
+        std::size_t begin;   ///< of its first line
+        std::size_t end;     ///< behind the end of its last line
+        std::string keyword; ///< its first word
     };
 
     /** A statement that opens a stanza, with the options that follow; both by number. */
@@ -51,6 +46,12 @@ class InterfacesFile {
     [[nodiscard]] const std::vector<Stanza>& stanzas() const { return _stanzas; }
 
     [[nodiscard]] const Statement& header(const Stanza& stanza) const { return _statements[stanza.header]; }
+
+    /** The words of a statement, one at least. Taken apart when they are asked for: most never are. */
+    [[nodiscard]] std::vector<Word> wordsOf(const Statement& statement) const;
+
+    /** The words behind the first, with a blank between each. */
+    [[nodiscard]] std::string valueOf(const Statement& statement) const;
 
     /** The end of line that the file has. */
     [[nodiscard]] std::string newline() const;

@@ -48,7 +48,7 @@ void InterfacesFiles::readFile(const std::string& path, int depth) {
     const File& file = _files.emplace_back(File{_root + path, InterfacesFile(std::move(*content))});
     for (const InterfacesFile::Stanza& stanza : file.content.stanzas()) {
         const InterfacesFile::Statement& header = file.content.header(stanza);
-        if (header.keyword().starts_with("source")) {
+        if (header.keyword.starts_with("source")) {
             follow(file, header, depth);
         } else {
             _stanzas.push_back({&file, &stanza});
@@ -59,11 +59,12 @@ void InterfacesFiles::readFile(const std::string& path, int depth) {
 void InterfacesFiles::follow(const File& file, const InterfacesFile::Statement& source, int depth) {
     const std::filesystem::path directory = std::filesystem::path(file.path.substr(_root.size())).parent_path();
     Linux::HostFiles files(_root);
-    for (auto word = source.words.begin() + 1; word != source.words.end(); ++word) {
+    const std::vector<InterfacesFile::Word> words = file.content.wordsOf(source);
+    for (auto word = words.begin() + 1; word != words.end(); ++word) {
         for (const std::string& path : files.expand(directory / word->text)) {
             if (std::filesystem::is_directory(_root + path)) {
                 readDirectory(path, depth);
-            } else if (source.keyword() == "source") {
+            } else if (source.keyword == "source") {
                 readFile(path, depth + 1);
             }
         }

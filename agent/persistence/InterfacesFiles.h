@@ -26,11 +26,12 @@ class InterfacesFiles {
         const File* file;
         const InterfacesFile::Stanza* stanza;
 
-        [[nodiscard]] const std::vector<InterfacesFile::Word>& words() const {
-            return file->content.header(*stanza).words;
+        /** The words of its header. */
+        [[nodiscard]] std::vector<InterfacesFile::Word> words() const {
+            return file->content.wordsOf(file->content.header(*stanza));
         }
 
-        [[nodiscard]] const std::string& keyword() const { return words().front().text; }
+        [[nodiscard]] const std::string& keyword() const { return file->content.header(*stanza).keyword; }
     };
 
     /**

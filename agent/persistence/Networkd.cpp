@@ -32,7 +32,7 @@ constexpr milliseconds patienceWithLease{15000};
 constexpr milliseconds step{20};
 
 /** networkd answers before it has begun; that nothing comes of it shows by nothing having come so long. */
-constexpr milliseconds patienceWithNothing{500};
+constexpr milliseconds patienceWithNothing{200};
 
 std::string unitPath(const std::string& interface) {
     return unitDirectory + ("05-marlo-" + interface + ".network");

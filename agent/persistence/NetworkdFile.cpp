@@ -11,7 +11,8 @@ namespace Orv::Agent::Persistence {
 
 namespace {
 
-constexpr std::string_view restMark = "# From other files:\n";
+/** A line of its own, which no value can hold. */
+constexpr std::string_view restMark = "\n# From other files:\n";
 
 /** An assignment or, without a key, anything else that stands between section headers; with its lines as they are. */
 struct Entry {
@@ -253,7 +254,7 @@ std::string dropInText(const NetworkdSettings& settings) {
 std::string unitText(const std::string& interface, const NetworkdSettings& settings, std::string_view rest) {
     return "# Written by marlo, which writes the first two sections anew with every change of the adapter.\n"
            "[Match]\nName=" +
-           interface + "\n\n" + networkSection(settings, false) + (rest.empty() ? "" : "\n" + std::string(restMark)) +
+           interface + "\n\n" + networkSection(settings, false) + (rest.empty() ? "" : std::string(restMark)) +
            std::string(rest);
 }
 

@@ -83,7 +83,7 @@ std::string edited(const InterfacesFile& file, const InterfacesFile::Stanza& sta
     TextEdit edit;
     StanzaEditor editor(file, stanza, edit);
     if (wanted.ipv4) {
-        editIpv4(editor, *wanted.ipv4, file.header(stanza).words[3].text);
+        editIpv4(editor, *wanted.ipv4, file.wordsOf(file.header(stanza)).at(3).text);
     }
     editNames(editor, wanted.names, namesAreRead);
     return edit.applied(file.text());

@@ -13,7 +13,7 @@ std::vector<std::string> statements(const std::string& text) {
     std::vector<std::string> found;
     const InterfacesFile file(text);
     for (const auto& statement : file.statements()) {
-        found.push_back(statement.keyword() + "|" + statement.value());
+        found.push_back(statement.keyword + "|" + file.valueOf(statement));
     }
     return found;
 }
@@ -42,7 +42,7 @@ TEST(InterfacesFile, EndsAStanzaAtTheNextOpener) {
         "source x\nsource-directory y\nno-auto-down a\nno-scripts a\nrename a=b\n stray\n");
     std::vector<std::pair<std::string, std::size_t>> stanzas;
     for (const auto& stanza : file.stanzas()) {
-        stanzas.emplace_back(file.header(stanza).keyword(), stanza.end - stanza.header - 1);
+        stanzas.emplace_back(file.header(stanza).keyword, stanza.end - stanza.header - 1);
     }
     EXPECT_THAT(stanzas,
                 ElementsAre(std::pair("iface", 2U), std::pair("auto", 0U), std::pair("allow-hotplug", 0U),
