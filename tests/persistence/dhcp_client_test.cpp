@@ -1,6 +1,7 @@
 #include "agent/persistence/DhcpClient.h"
 #include "agent/persistence/Ifupdown.h"
 #include "tests/persistence/Plans.h"
+#include "tests/support/Namespace.h"
 
 #include <chrono>
 #include <csignal>
@@ -142,6 +143,18 @@ TEST_F(DhcpClientTest, DoesNotEndAClientThatServesOthersToo) {
     const pid_t child = run({script("dhclient", stays), interface, interface + "x"});
     EXPECT_THAT(messageOf([&] { DhcpClient(environment).stop(interface); }), HasSubstr("serves other interfaces"));
     EXPECT_FALSE(hasEnded(child));
+}
+
+TEST_F(DhcpClientTest, LeavesAClientOfAnInterfaceOfThatNameInAnotherNamespaceAlone) {
+    REQUIRE_NAMESPACES();
+    const std::string client = script("dhclient", stays);
+    const Namespace other;
+    pid_t child = -1;
+    other.run([&] { child = run({client, interface}); });
+    EXPECT_FALSE(DhcpClient(environment).isRunning(interface));
+    EXPECT_FALSE(DhcpClient(environment).stop(interface));
+    EXPECT_FALSE(hasEnded(child));
+    other.run([&] { EXPECT_TRUE(DhcpClient(environment).stop(interface)); });
 }
 
 TEST_F(DhcpClientTest, StartsTheClientAsIfupDoes) {
