@@ -31,8 +31,8 @@ constexpr milliseconds patienceWithNetworkd{5000};
 constexpr milliseconds patienceWithLease{15000};
 constexpr milliseconds step{20};
 
-/** networkd answers before it has begun; that nothing comes of it shows by nothing having come so long. */
-constexpr milliseconds patienceWithNothing{200};
+/** networkd answers before it has begun; that it has shows in its file, unless it finds nothing to do after all. */
+constexpr milliseconds patienceWithNothing{2000};
 
 std::string unitPath(const std::string& interface) {
     return unitDirectory + ("05-marlo-" + interface + ".network");
@@ -202,7 +202,9 @@ bool awaitConfigured(const InterfaceFacts& interface, const Environment& environ
 } // namespace
 
 FileEdits Networkd::plan(const InterfaceFacts& interface, const AdapterSettings& wanted) const {
-    return Plan(_environment, interface).edits(wanted);
+    FileEdits edits = Plan(_environment, interface).edits(wanted);
+    _hasEdits = !edits.empty();
+    return edits;
 }
 
 bool Networkd::stopDhcp(const InterfaceFacts& interface) {
@@ -220,7 +222,7 @@ void Networkd::activate(const InterfaceFacts& interface, const AdapterSettings& 
     }
     const LinkState before = stateOf(interface, _environment);
     bus.call(manager, "Reload", [](sd_bus_message*) { return 0; });
-    if (!wanted.ipv4 || wanted.ipv4->mode == AddressMode::leased) {
+    if (!_hasEdits || !wanted.ipv4 || wanted.ipv4->mode == AddressMode::leased) {
         return;
     }
     if (!awaitConfigured(interface, _environment, before, *wanted.ipv4) && _environment.report) {

@@ -30,7 +30,10 @@ class Networkd : public Manager {
     /** Clients that run beside networkd; its own goes with activate(). */
     bool stopDhcp(const InterfaceFacts& interface) override;
 
-    /** Has networkd read its files again and waits, some seconds at most, until the interface is configured. */
+    /**
+     * Has networkd read its files again. Where the last plan had edits, waits, some seconds at most, until the
+     * interface is configured.
+     */
     void activate(const InterfaceFacts& interface, const AdapterSettings& wanted) override;
 
     /** networkd starts its client by itself: waits for a lease, some seconds at most. */
@@ -44,6 +47,7 @@ class Networkd : public Manager {
 
   private:
     Environment _environment;
+    mutable bool _hasEdits = false; ///< of the last plan: networkd will have something to do
 };
 
 } // namespace Orv::Agent::Persistence

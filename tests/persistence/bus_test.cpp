@@ -106,10 +106,23 @@ TEST_F(BusTest, WaitsUntilNetworkdHasConfiguredTheInterface) {
         host.write("/run/systemd/netif/links/2", "ADMIN_STATE=configured\n#\n");
     });
     const auto start = std::chrono::steady_clock::now();
-    Networkd(environment).activate(interface, fixedAt("192.0.2.10/24"));
+    Networkd manager(environment);
+    applied(manager.plan(interface, fixedAt("192.0.2.10/24")));
+    manager.activate(interface, fixedAt("192.0.2.10/24"));
     EXPECT_GT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(700));
     networkd.join();
     EXPECT_THAT(reports, testing::IsEmpty());
+}
+
+TEST_F(BusTest, DoesNotWaitWhereNothingWasEdited) {
+    MockServices services(*bus);
+    host.write("/run/systemd/netif/links/2", "ADMIN_STATE=configured\n");
+    applied(Networkd(environment).plan(interface, fixedAt("192.0.2.10/24")));
+    Networkd manager(environment);
+    applied(manager.plan(interface, fixedAt("192.0.2.10/24")));
+    const auto start = std::chrono::steady_clock::now();
+    manager.activate(interface, fixedAt("192.0.2.10/24"));
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(1));
 }
 
 TEST_F(BusTest, WaitsForALeaseOfNetworkd) {
