@@ -73,7 +73,7 @@ std::shared_ptr<const Tree> treeOf(const Event& event) {
 
 void PickUps::addPickUp() {
     _count.fetch_add(1);
-    if (!_expectsThreadEnds.load()) {
+    if (_wakesOnPickUp.load()) {
         _wakeUp->signal();
     }
 }

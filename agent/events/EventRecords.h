@@ -29,8 +29,8 @@ class PickUps {
 
     void addPickUp();
 
-    /** Whether an event's thread is waited for, so that its pick-up alone wakes nobody. True in the beginning. */
-    void expectThreadEnds(bool expected) { _expectsThreadEnds.store(expected); }
+    /** Whether a pick-up wakes: not where its thread's end is waited for, which does. Not in the beginning. */
+    void wakeOnPickUp(bool wakes) { _wakesOnPickUp.store(wakes); }
 
     /** The thread that picked an event up has ended: whatever it did with the event is done. */
     void addThreadEnd(std::uint64_t number);
@@ -45,7 +45,7 @@ class PickUps {
     std::shared_ptr<const WakeUp> _wakeUp;
     std::atomic<std::uint64_t> _count{0};
     std::atomic<std::uint64_t> _lastThreadEnd{0};
-    std::atomic<bool> _expectsThreadEnds{true};
+    std::atomic<bool> _wakesOnPickUp{false};
 };
 
 /**

@@ -42,35 +42,35 @@ void Handover::settle(Clock::time_point now) {
     }
     if (const auto last = _pickUps->lastThreadEnd(); last != _seenThreadEnd) {
         _seenThreadEnd = last;
-        expectThreadEnds(true);
+        _threadsEnd = true;
     }
     if (!_outstanding) {
         return;
     }
-    if (_threadsEnd && now >= _outstanding->since + _times.work) {
-        expectThreadEnds(false); // pick-ups wake from now on; one that came before is seen here
+    if (now >= _outstanding->since + _times.work) {
+        _outstanding->isLate = true;
+        _pickUps->wakeOnPickUp(true); // one that came before is seen below
     }
     if (const auto thread = _records.pickedUpBy(_outstanding->number)) {
-        settlePickUp(*thread);
+        settlePickUp(*thread, now);
     } else if (now >= _outstanding->since + patience()) {
         giveUp();
     }
 }
 
 /** Picked up on this thread, an event was done with before the call returned; on another, when that has ended. */
-void Handover::settlePickUp(std::thread::id thread) {
+void Handover::settlePickUp(std::thread::id thread, Clock::time_point now) {
     const bool isDone = thread == std::this_thread::get_id() || _seenThreadEnd >= _outstanding->number;
     if (_threadsEnd && !isDone) {
-        return;
+        _outstanding->pickedUp = _outstanding->pickedUp.value_or(now);
+        if (now < *_outstanding->pickedUp + _times.work) {
+            return;
+        }
+        _threadsEnd = false;
     }
     _records.close(_outstanding->number);
     _outstanding.reset();
     _missed = 0;
-}
-
-void Handover::expectThreadEnds(bool expected) {
-    _threadsEnd = expected;
-    _pickUps->expectThreadEnds(expected);
 }
 
 std::optional<Handover::Delivery> Handover::next(Clock::time_point now) {
@@ -82,7 +82,8 @@ std::optional<Handover::Delivery> Handover::next(Clock::time_point now) {
     _waiting.pop_front();
     auto [number, path] = _records.open(event, _pickUps);
     if (event.code == EventCode::status) {
-        _outstanding = {number, event.node->description, now};
+        _outstanding = {number, event.node->description, now, std::nullopt, false};
+        _pickUps->wakeOnPickUp(!_threadsEnd);
     } else {
         _records.close(number);
     }
@@ -93,7 +94,11 @@ std::optional<Handover::Clock::time_point> Handover::deadline() const {
     if (!_outstanding) {
         return std::nullopt;
     }
-    return _outstanding->since + (_threadsEnd ? std::min(_times.work, patience()) : patience());
+    if (_outstanding->pickedUp) {
+        return *_outstanding->pickedUp + _times.work;
+    }
+    const bool isAskedBefore = _threadsEnd && !_outstanding->isLate;
+    return _outstanding->since + (isAskedBefore ? std::min(_times.work, patience()) : patience());
 }
 
 } // namespace Orv::Agent

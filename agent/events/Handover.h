@@ -24,8 +24,8 @@ struct HandoverTimes {
     /** Where they are not: shared among the events that wait, which bounds how far they fall behind. */
     std::chrono::nanoseconds crowded = std::chrono::milliseconds(100);
 
-    /** From the handing over to the end of the thread that picked the event up, where such threads end. */
-    std::chrono::nanoseconds work = std::chrono::milliseconds(250);
+    /** From the pick-up of an event to the end of the thread that did it, where such threads end. */
+    std::chrono::nanoseconds work = std::chrono::milliseconds(500);
 };
 
 /**
@@ -70,12 +70,13 @@ class Handover {
         std::uint64_t number;
         std::string name;
         Clock::time_point since;
+        std::optional<Clock::time_point> pickedUp; ///< when that was seen
+        bool isLate = false;                       ///< so that its pick-up wakes
     };
 
     [[nodiscard]] std::chrono::nanoseconds patience() const;
     void settle(Clock::time_point now);
-    void settlePickUp(std::thread::id thread);
-    void expectThreadEnds(bool expected);
+    void settlePickUp(std::thread::id thread, Clock::time_point now);
     void giveUp();
 
     EventRecords& _records;

@@ -8,6 +8,7 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <poll.h>
 
 namespace {
 
@@ -72,6 +73,43 @@ TEST_F(HandoverTest, WaitsForTheThreadThatPickedUpToEnd) {
         EXPECT_EQ(second, "") << "the work on the first may not be done";
     }).join();
     EXPECT_NE(next(), "");
+}
+
+TEST_F(HandoverTest, WaitsForAThreadThatWasLateToo) {
+    add("eth0");
+    add("eth1");
+    const std::string first = next();
+    now += 1s;
+    EXPECT_EQ(next(), "");
+    std::thread([&] {
+        readEvent(backEnd, EventCode::status, first);
+        std::string second;
+        std::thread([&] { second = next(); }).join();
+        EXPECT_EQ(second, "");
+        EXPECT_EQ(handover.deadline(), now + times.work);
+    }).join();
+    EXPECT_NE(next(), "");
+}
+
+TEST_F(HandoverTest, IsWokenByAPickUpWhereNoThreadsEndIsAwaited) {
+    const auto isAwake = [&] {
+        pollfd file{wakeUp->descriptor(), POLLIN, 0};
+        return ::poll(&file, 1, 0) == 1;
+    };
+    add("eth0");
+    const std::string first = next();
+    std::thread([&] {
+        readEvent(backEnd, EventCode::status, first);
+        EXPECT_FALSE(isAwake()) << "the thread's end will do";
+    }).join();
+    EXPECT_TRUE(isAwake());
+    wakeUp->clear();
+    add("eth1");
+    const std::string second = next();
+    now += 1s;
+    next();
+    readEvent(backEnd, EventCode::status, second);
+    EXPECT_TRUE(isAwake()) << "it was late";
 }
 
 TEST_F(HandoverTest, LearnsThatAReceiversThreadsDoNotEnd) {
