@@ -292,7 +292,7 @@ TEST_F(LibraryMonitoringTest, LeaksNothingWhenStartedAndStoppedAThousandTimes) {
     for (int attempt = 0; attempt < 100 && entriesOf("/proc/self/task") > threads; ++attempt) {
         std::this_thread::sleep_for(10ms);
     }
-    EXPECT_EQ(entriesOf("/proc/self/task"), threads);
+    EXPECT_LE(entriesOf("/proc/self/task"), threads);
     EXPECT_EQ(entriesOf("/proc/self/fd"), files);
     EXPECT_LE(allocatedBytes(), bytes + someBytes);
 }

@@ -192,7 +192,7 @@ TEST_F(LinuxMonitorTest, leaksNothingWhenStartedAndStoppedAThousandTimes) {
         often.stop(key);
     }
     // The kernel lists a thread for a moment longer than it can be joined.
-    EXPECT_EQ(awaited(threads, [&] { return count("/proc/self/task"); }), threads);
+    EXPECT_TRUE(awaited(true, [&] { return count("/proc/self/task") <= threads; }));
     EXPECT_EQ(count("/proc/self/fd"), files);
 }
 
