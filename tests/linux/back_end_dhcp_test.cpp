@@ -134,6 +134,18 @@ TEST_F(LinuxDhcpTest, refusesAnAddressWhileTheModeIsDhcp) {
     expectLease();
 }
 
+TEST_F(LinuxDhcpTest, goesOnTryingWhereNoServerAnswers) {
+    stopServer();
+    set(PROP_DHCP_ENABLED, dhcp);
+    EXPECT_THAT(clients(), HasSubstr("dhclient"));
+    EXPECT_THAT(addresses(), IsEmpty());
+    EXPECT_THAT(routes(), IsEmpty());
+    EXPECT_EQ(numberOf(*tree(), "left", PROP_DHCP_ENABLED), dhcp);
+    makeStatic("192.0.2.30", "255.255.255.0", "192.0.2.1");
+    EXPECT_THAT(clients(), IsEmpty());
+    EXPECT_THAT(addresses(), ElementsAre("192.0.2.30/24 brd 192.0.2.255"));
+}
+
 TEST_F(LinuxDhcpTest, staysStaticWhenNoClientCanBeStarted) {
     const Lines before = addresses();
     const std::string file = interfaces();
