@@ -180,8 +180,14 @@ std::vector<Tree::NodePointer> HostTree::structure(const std::string& hostName) 
     };
     add(hostPath, "", hostName);
     add(chassisPath, hostPath, chassisDescription);
+    const Device* last = nullptr;
     for (const auto& [index, interface] : _interfaces) {
         const Device& device = interface.device;
+        // Virtual interfaces of one kind share a device, by the thousand.
+        if (last != nullptr && last->path == device.path) {
+            continue;
+        }
+        last = &device;
         if (device.managementController) {
             add(controllerPath, hostPath, controllerDescription);
         }

@@ -149,7 +149,7 @@ class RouteObject : public KernelObject {
 struct InterfaceTables {
     int index = 0;
     std::vector<AddressObject> addresses;
-    std::vector<RouteObject> routes; ///< of all tables, but not those that the kernel makes itself
+    std::vector<RouteObject> routes; ///< unicast, of all tables, but not those that the kernel makes itself
 
     bool operator==(const InterfaceTables&) const = default;
 };

@@ -79,6 +79,8 @@ template <typename Accept>
 std::vector<RouteObject> readRoutes(RequestSocket& requests, int index, Accept accept) {
     DumpRequest<rtmsg> request(RTM_GETROUTE);
     request.header().rtm_family = AF_INET;
+    // Of the others the local table has two for each address of the host, made by the kernel.
+    request.header().rtm_type = RTN_UNICAST;
     if (index != 0) {
         mnl_attr_put_u32(&request.message(), RTA_OIF, static_cast<std::uint32_t>(index));
     } else {
@@ -89,7 +91,8 @@ std::vector<RouteObject> readRoutes(RequestSocket& requests, int index, Accept a
         const bool readable =
             message.nlmsg_type == RTM_NEWROUTE && mnl_nlmsg_get_payload_len(&message) >= sizeof(rtmsg);
         const auto* header = static_cast<const rtmsg*>(mnl_nlmsg_get_payload(&message));
-        if (readable && header->rtm_protocol != RTPROT_KERNEL && (header->rtm_flags & RTM_F_CLONED) == 0) {
+        const bool counts = readable && header->rtm_type == RTN_UNICAST && header->rtm_protocol != RTPROT_KERNEL;
+        if (counts && (header->rtm_flags & RTM_F_CLONED) == 0) {
             if (RouteObject route(message); accept(route)) {
                 routes.push_back(std::move(route));
             }

@@ -20,7 +20,7 @@ class LiveIpv4 {
     LiveIpv4(const LiveIpv4&) = delete;
     LiveIpv4& operator=(const LiveIpv4&) = delete;
 
-    /** What there is for the interface. Routes of a kind that the kernel makes by itself are left out. */
+    /** What there is for the interface: its addresses, and the unicast routes that the kernel has not made itself. */
     [[nodiscard]] virtual InterfaceTables read(int index) = 0;
 
     /** What becomes of addresses that run out, beside the one that stands for the interface. */
