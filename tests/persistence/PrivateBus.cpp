@@ -1,5 +1,7 @@
 #include "tests/persistence/PrivateBus.h"
 
+#include "agent/config/Descriptor.h"
+
 #include <array>
 #include <chrono>
 #include <csignal>
@@ -7,6 +9,8 @@
 #include <stdexcept>
 
 #include <arpa/inet.h>
+#include <sys/socket.h>
+#include <sys/un.h>
 #include <sys/wait.h>
 #include <systemd/sd-bus.h>
 #include <unistd.h>
@@ -21,6 +25,15 @@ void require(int result, const char* what) {
     if (result < 0) {
         throw std::runtime_error(std::string(what) + ": error " + std::to_string(-result));
     }
+}
+
+/** The socket is there a moment before the daemon listens to it. */
+bool listens(const std::string& path) {
+    const Agent::Descriptor socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    path.copy(address.sun_path, sizeof address.sun_path - 1);
+    return ::connect(socket.number(), reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0;
 }
 
 int answer(sd_bus_message* message, void* services, const std::string& call) {
@@ -93,7 +106,7 @@ PrivateBus::PrivateBus() {
         ::execl(daemonPath, daemonPath, configuration.c_str(), "--nofork", "--nopidfile", nullptr);
         ::_exit(127);
     }
-    for (int i = 0; i < 500 && !std::filesystem::exists(_files.at("/bus")); ++i) {
+    for (int i = 0; i < 500 && !listens(_files.at("/bus").string()); ++i) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
 }
