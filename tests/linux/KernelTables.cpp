@@ -58,6 +58,15 @@ Lines addressLines(const Namespace& space, const std::string& interface) {
     return lines;
 }
 
+void addIpv6(const Namespace& space, const std::string& interface, const std::string& address) {
+    space.ip("addr add " + address + "/64 dev " + interface);
+    // Duplicate detection ends in its own time, and the route to oneself comes last.
+    space.shell("for i in $(seq 100); do ip -6 addr show dev " + interface +
+                " | grep -q tentative || { [ $(ip -6 -o addr show dev " + interface +
+                " | wc -l) = $(ip -6 route show table local type local dev " + interface +
+                " | wc -l) ] && exit 0; }; sleep 0.05; done; exit 1");
+}
+
 std::string ipv6Addresses(const Namespace& space, const std::string& interface) {
     return space.ip("-j -6 addr show dev " + interface);
 }

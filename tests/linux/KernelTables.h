@@ -19,6 +19,9 @@ using Lines = std::vector<std::string>;
  */
 Lines addressLines(const Namespace& space, const std::string& interface);
 
+/** Adds an IPv6 address of a /64 and waits until the kernel has nothing more to do for those of the interface. */
+void addIpv6(const Namespace& space, const std::string& interface, const std::string& address);
+
 /** All IPv6 addresses of the interface, as `ip -j` has them. */
 std::string ipv6Addresses(const Namespace& space, const std::string& interface);
 

@@ -81,11 +81,9 @@ TEST_F(LinuxWriteTest, writesWhatTheResolverReads) {
 }
 
 TEST_F(LinuxWriteTest, leavesOtherAddressesRoutesAndIpv6) {
-    space->shell("echo 0 > /proc/sys/net/ipv6/conf/left/accept_dad");
-    for (const char* more : {"addr add 192.0.2.11/24 dev left", "addr add 2001:db8::1/64 dev left",
-                             "route add 10.0.0.0/8 via 192.0.2.3 dev left"}) {
-        space->ip(more);
-    }
+    addIpv6(*space, "left", "2001:db8::1");
+    space->ip("addr add 192.0.2.11/24 dev left");
+    space->ip("route add 10.0.0.0/8 via 192.0.2.3 dev left");
     const std::string ipv6 = ipv6Addresses(*space, "left");
     set(PROP_IPV4_ADDRESS, Text("192.0.2.20"));
     EXPECT_THAT(addresses(), ElementsAre("192.0.2.20/24 brd 192.0.2.255", "192.0.2.11/24 secondary"));

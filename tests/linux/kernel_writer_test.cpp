@@ -242,16 +242,15 @@ TEST_F(KernelWriterTest, givesAGatewayToADefaultRouteThatHasNone) {
 }
 
 TEST_F(KernelWriterTest, doesNotTouchIpv6) {
-    space->shell("echo 0 > /proc/sys/net/ipv6/conf/left/accept_dad");
-    space->ip("addr add 2001:db8::1/64 dev left");
+    addIpv6(*space, "left", "2001:db8::1");
     space->ip("-6 route add default via 2001:db8::ff dev left");
     addAddresses({"192.0.2.10/24"});
     const std::string addressesBefore = ipv6Addresses(*space, "left");
-    const std::string routesBefore = space->ip("-j -6 route show table all");
+    const std::string routesBefore = space->ip("-j -6 route show table all dev left");
     write(fixedAt("192.0.2.20/24", "192.0.2.1"));
     write({AddressMode::leased, std::nullopt, std::nullopt});
     EXPECT_EQ(ipv6Addresses(*space, "left"), addressesBefore);
-    EXPECT_EQ(space->ip("-j -6 route show table all"), routesBefore);
+    EXPECT_EQ(space->ip("-j -6 route show table all dev left"), routesBefore);
 }
 
 TEST_F(KernelWriterTest, restoresWhatWasThereBefore) {
