@@ -48,9 +48,8 @@ class WriteFixture : public testing::Test {
     }
 
     void TearDown() override {
-        // Only where /run is the test's own.
-        if (backEnd) {
-            space->shell("for file in /run/*.pid; do [ ! -e $file ] || kill $(cat $file) || true; done");
+        if (space) {
+            forClients("kill -9 ${at#/proc/}");
         }
         if (serves) {
             stopServer();
@@ -80,8 +79,8 @@ class WriteFixture : public testing::Test {
 
     /** What a boot makes of the files: nothing is left of what was there. */
     void boot() const {
-        space->shell("for file in /run/dhclient*.pid; do [ ! -e $file ] || kill $(cat $file); done; sleep 0.1; "
-                     "ip link set left down; ip -4 addr flush dev left; rm -f /run/network/ifstate* /run/dhclient*; "
+        forClients("kill -9 ${at#/proc/}");
+        space->shell("ip link set left down; ip -4 addr flush dev left; rm -f /run/network/ifstate* /run/dhclient*; "
                      "ifup -a 2>&1");
     }
 
@@ -137,10 +136,13 @@ class WriteFixture : public testing::Test {
     }
 
     /** The processes in the namespace that are DHCP clients, one per line. */
-    [[nodiscard]] std::string clients() const {
-        return space->shell("for comm in $(grep -lx dhclient /proc/[0-9]*/comm 2> /dev/null); do at=${comm%comm}; "
-                            "[ \"$(readlink ${at}ns/net)\" != \"$(readlink /proc/self/ns/net)\" ] || "
-                            "{ tr '\\0' ' ' < ${at}cmdline; echo; }; done");
+    [[nodiscard]] std::string clients() const { return forClients("tr '\\0' ' ' < $at/cmdline; echo"); }
+
+    /** Runs a command for each DHCP client in the namespace, with its directory of /proc in `at`. */
+    std::string forClients(const std::string& command) const {
+        return space->shell("for comm in $(grep -lx dhclient /proc/[0-9]*/comm 2> /dev/null); do at=${comm%/comm}; "
+                            "[ \"$(readlink $at/ns/net)\" != \"$(readlink /proc/self/ns/net)\" ] || { " +
+                            command + "; }; done");
     }
 
     std::unique_ptr<Namespace> space;
