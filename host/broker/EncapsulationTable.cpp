@@ -106,9 +106,13 @@ CMPISelectExp* newSelectExp(CMPIStatus& status, BrokerState& broker, const char*
         status.rc = CMPI_RC_ERR_INVALID_PARAMETER;
         return nullptr;
     }
+    const auto known = filter::readLanguage(language);
+    if (!known) {
+        status.rc = CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED;
+        return nullptr;
+    }
     try {
-        auto filter =
-            std::make_shared<const filter::Filter>(filter::Filter::parse(query, filter::readLanguage(language)));
+        auto filter = std::make_shared<const filter::Filter>(filter::Filter::parse(query, *known));
         if (projection != nullptr) {
             *projection = projectionOf(*filter);
         }

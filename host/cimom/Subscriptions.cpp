@@ -87,8 +87,13 @@ Subscriptions::Entry Subscriptions::makeEntry(const std::string& nameSpace, cons
     if (!_schema.hasNameSpace(nameSpace)) {
         requireClass(_schema, nameSpace, ""); // says which namespaces there are
     }
+    const auto known = filter::readLanguage(language);
+    if (!known) {
+        throw RequestError(CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED,
+                           "unknown query language '" + language + "', known are WQL and CQL");
+    }
     try {
-        filter::Filter parsed = filter::Filter::parse(text, filter::readLanguage(language));
+        filter::Filter parsed = filter::Filter::parse(text, *known);
         parsed.check(_schema, nameSpace);
         const Class& definition = *_schema.findClass(nameSpace, parsed.className());
         if (const std::string fault = indicationFault(definition); !fault.empty()) {

@@ -5,6 +5,7 @@
 #include "host/cli/Json.h"
 #include "host/cli/Table.h"
 #include "host/cli/Text.h"
+#include "host/cli/Watch.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -216,6 +217,8 @@ ExitCode run(ObjectManager& manager, const Options& options, Output& output) {
     case Command::Gateway:
     case Command::Restart:
         return runChange(manager, options, output);
+    case Command::Watch:
+        return runWatch(manager, options, output);
     case Command::Classes:
         return runClasses(manager, options, output);
     case Command::Completion:

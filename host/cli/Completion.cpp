@@ -58,6 +58,10 @@ constexpr const char* ScriptTail = R"bash(
         mapfile -t COMPREPLY < <(compgen -d -- "$current")
         return
         ;;
+    --language)
+        mapfile -t COMPREPLY < <(compgen -W "WQL CQL" -- "$current")
+        return
+        ;;
     --log-sink | --trace-sink)
         mapfile -t COMPREPLY < <(compgen -W "stderr syslog file:" -- "$current")
         return
@@ -76,7 +80,7 @@ constexpr const char* ScriptTail = R"bash(
         return
     fi
     case "$subcommand" in
-    enum | names)
+    enum | names | watch)
         mapfile -t COMPREPLY < <(compgen -W "$(_marlo_classes "${COMP_WORDS[0]}")" -- "$current")
         ;;
     get)

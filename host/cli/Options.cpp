@@ -43,6 +43,17 @@ constexpr const char* GetExamples = R"(Examples:
   marlo get 'MARLO_NetworkAdapterConfiguration.SettingID="eth0"'
   marlo get 'root/tavis:MARLO_NetworkAdapterConfiguration.SettingID="eth0"' -p IPAddress --json)";
 
+constexpr const char* WatchExamples =
+    R"(Each indication is a line: time, adapter, event, severity and message. Exit status: 0 when it ends by
+--timeout or an interrupt, or with --count when that many have come; 1 when nothing can be watched, or
+when it ends before that many have come; 2 when the command line is wrong.
+
+Examples:
+  marlo watch
+  marlo watch MARLO_NetworkAdapterOfflineEvent --count 1
+  marlo watch --filter "SELECT * FROM CIM_AlertIndication WHERE PerceivedSeverity >= 3" --timeout 60
+  marlo watch --json)";
+
 constexpr const char* ClassesExamples = R"(Examples:
   marlo classes
   marlo classes -n root/quarn --names)";
@@ -265,6 +276,44 @@ void addHostChanges(CLI::App& app, Options& options) {
     addChangeOptions(restart, options);
 }
 
+void addWatchCommand(CLI::App& app, Options& options) {
+    WatchOptions& watch = options.watch;
+    CLI::App& command = addCommand(app, options, Command::Watch, "watch",
+                                   "Show what happens to the adapters, as it happens", WatchExamples);
+    command
+        .add_option("CLASS", watch.classes,
+                    "Classes of indications, with their subclasses; where none is named, those of the adapters")
+        ->type_name("");
+    command.add_option("--filter", watch.filter, "Show what this SELECT statement chooses, in the place of classes")
+        ->type_name("TEXT");
+    command.add_option("--language", watch.language, "The filter's language: WQL or CQL")
+        ->type_name("NAME")
+        ->capture_default_str();
+    command.add_option("--count", watch.count, "End when so many have come")
+        ->type_name("N")
+        ->check(CLI::Range(1U, 4'000'000'000U).description(""));
+    command.add_option("--timeout", watch.timeout, "End after so many seconds")->type_name("SECONDS");
+    command.add_flag("--json", options.json, "Print JSON: an object on a line for each indication");
+    addNameSpace(command, options);
+    addAgentOptions(command, options.agent);
+    addDirectoryOptions(command, options.directories);
+}
+
+/** Puts the indications of adapters where nothing is named. */
+void completeWatch(WatchOptions& watch) {
+    if (!watch.filter.empty() && !watch.classes.empty()) {
+        throw UsageError("--filter names its class itself: it goes with no CLASS");
+    }
+    constexpr double longest = 1e9;
+    if (watch.timeout && !(*watch.timeout > 0 && *watch.timeout <= longest)) { // so for what is no number as well
+        throw UsageError("--timeout: expected seconds above 0, at most 1000000000");
+    }
+    if (watch.classes.empty()) {
+        watch.classes = {"MARLO_NetworkAdapterOnlineEvent", "MARLO_NetworkAdapterOfflineEvent",
+                         "MARLO_NetworkAdapterSwitchOverEvent", "MARLO_NetworkAdapterSwitchBackEvent"};
+    }
+}
+
 void addOtherCommands(CLI::App& app, Options& options) {
     CLI::App& classes =
         addCommand(app, options, Command::Classes, "classes", "Show the classes of a namespace", ClassesExamples);
@@ -307,6 +356,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     addGenericChanges(app, line.options);
     addAddressChanges(app, line.options);
     addHostChanges(app, line.options);
+    addWatchCommand(app, line.options);
     addOtherCommands(app, line.options);
     try {
         app.parse(argc, argv);
@@ -319,6 +369,9 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
         return line;
     } catch (const CLI::ParseError& error) {
         throw UsageError(error.what());
+    }
+    if (line.options.command == Command::Watch) {
+        completeWatch(line.options.watch);
     }
     if (line.options.command == Command::Completion) {
         line.answer = makeBashCompletion(app);

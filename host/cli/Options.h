@@ -29,6 +29,7 @@ enum class Command {
     Dns,
     Gateway,
     Restart,
+    Watch,
     Classes,
     Completion
 };
@@ -50,6 +51,15 @@ struct DirectoryOptions {
     std::string libraries;
 };
 
+/** What to watch for, and how long. */
+struct WatchOptions {
+    std::vector<std::string> classes; ///< of indications
+    std::string filter;               ///< in their place
+    std::string language = "WQL";     ///< of the filter
+    std::optional<unsigned> count;
+    std::optional<double> timeout; ///< seconds
+};
+
 struct Options {
     Command command = Command::Adapters;
     std::string argument; ///< a class, a path, an adapter or a shell
@@ -65,6 +75,7 @@ struct Options {
     std::vector<std::string> properties; ///< none: all
     bool json = false;
     bool namesOnly = false;
+    WatchOptions watch;
     AgentOptions agent;
     DirectoryOptions directories;
 };

@@ -24,8 +24,7 @@ class Error : public std::runtime_error {
 
     /**
      * CMPI_RC_ERR_INVALID_QUERY; CMPI_RC_ERR_INVALID_CLASS when the class of FROM is unknown;
-     * CMPI_RC_ERR_QUERY_FEATURE_NOT_SUPPORTED for what the language has and this does not;
-     * CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED.
+     * CMPI_RC_ERR_QUERY_FEATURE_NOT_SUPPORTED for what the language has and this does not.
      */
     [[nodiscard]] CMPIrc code() const { return _code; }
 

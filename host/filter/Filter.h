@@ -16,6 +16,7 @@
 #include "host/filter/Pattern.h"
 #include "host/model/Instance.h"
 
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -31,8 +32,8 @@ enum class Truth { no, unknown, yes };
 
 enum class Language { wql, cql };
 
-/** "WQL", or "CQL", "CIM:CQL", "DMTF:CQL", without regard to case. Throws Error for any other. */
-Language readLanguage(std::string_view name);
+/** "WQL", or "CQL", "CIM:CQL", "DMTF:CQL", without regard to case; nothing for any other. */
+std::optional<Language> readLanguage(std::string_view name);
 
 /** One side of a comparison. */
 struct Operand {

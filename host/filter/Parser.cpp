@@ -56,15 +56,14 @@ Condition join(Condition::Kind kind, std::vector<Condition>&& children) {
 
 } // namespace
 
-Language readLanguage(std::string_view name) {
+std::optional<Language> readLanguage(std::string_view name) {
     if (equalNames(name, "WQL")) {
         return Language::wql;
     }
     if (equalNames(name, "CQL") || equalNames(name, "CIM:CQL") || equalNames(name, "DMTF:CQL")) {
         return Language::cql;
     }
-    throw Error(CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED, "", 0,
-                "unknown query language '" + std::string(name) + "', known are WQL and CQL");
+    return std::nullopt;
 }
 
 Filter Filter::parse(std::string_view text, Language language) {

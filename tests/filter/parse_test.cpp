@@ -30,12 +30,7 @@ TEST(Parsing, KnowsTheLanguagesByName) {
     EXPECT_EQ(filter::readLanguage("CIM:CQL"), Language::cql);
     EXPECT_EQ(filter::readLanguage("dmtf:cql"), Language::cql);
     for (const char* name : {"", "SQL", "WQL2", "DMTF:FQL"}) {
-        try {
-            filter::readLanguage(name);
-            FAIL() << name;
-        } catch (const filter::Error& error) {
-            EXPECT_EQ(error.code(), CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED) << name;
-        }
+        EXPECT_FALSE(filter::readLanguage(name)) << name;
     }
 }
 
