@@ -69,6 +69,8 @@ TEST_F(MarloShell, CompletesCommandsAndOptions) {
 
 TEST_F(MarloShell, CompletesClassesOfTheNamespaceAndFiles) {
     EXPECT_THAT(complete("marlo enum MARLO_NetworkAdapterC"), ElementsAre("MARLO_NetworkAdapterConfiguration"));
+    EXPECT_THAT(complete("marlo watch MARLO_NetworkAdapterO"),
+                ElementsAre("MARLO_NetworkAdapterOnlineEvent", "MARLO_NetworkAdapterOfflineEvent"));
     EXPECT_THAT(complete("marlo names -n root/quarn TAVIS_"), ElementsAre("TAVIS_NetworkCard", "TAVIS_NetworkPort"));
     EXPECT_THAT(complete("marlo get MARLO_L"), ElementsAre("MARLO_LogicalNetworkAdapter."));
     EXPECT_THAT(complete("marlo adapters --tree ho"), ElementsAre("host.toml"));
@@ -92,7 +94,7 @@ TEST_F(MarloShell, ShowsItsArgumentsByTheirNamesAlone) {
 
 TEST_F(MarloShell, ExplainsEveryCommandWithExamples) {
     for (const char* command : {"adapters", "enum", "names", "get", "invoke", "set", "static", "dhcp", "dns",
-                                "gateway", "restart", "classes", "completion"}) {
+                                "gateway", "restart", "watch", "classes", "completion"}) {
         const Outcome outcome = marlo({command, "--help"});
         EXPECT_EQ(outcome.exitCode, 0) << command;
         EXPECT_EQ(outcome.err, "") << command;

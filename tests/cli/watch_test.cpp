@@ -168,7 +168,7 @@ class WatchedHost : public MarloTest {
   protected:
     /** Runs `script` in bash, with the watching marlo as $pid, once it watches. */
     Outcome watch(const std::string& arguments, const std::string& script) const {
-        const std::string whole = "set -m\n" MARLO_EXECUTABLE " watch " + arguments +
+        const std::string whole = "set -m; rm -f out err\n" MARLO_EXECUTABLE " watch " + arguments +
                                   " >out 2>err & pid=$!\n"
                                   "for i in {1..400}; do grep -q watching err && break; sleep 0.05; done\n" +
                                   script + "\nwait $pid";
@@ -219,9 +219,11 @@ TEST_F(WatchedHost, PrintsEachLineAtOnce) {
 }
 
 TEST_F(WatchedHost, EndsCleanlyWhenInterrupted) {
-    for (const char* signal : {"INT", "TERM"}) {
-        const std::string kill = std::string("kill -") + signal + " $pid\n";
-        const Outcome outcome = watch("", change("eth0", "12") + "sleep 1\n" + kill + change("eth0", "1"));
+    const std::vector<std::pair<std::string, std::string>> signalsAndStatuses = {{"INT", "12"}, {"TERM", "1"}};
+    for (const auto& [signal, status] : signalsAndStatuses) {
+        const std::string kill = "kill -" + signal + " $pid\n";
+        const std::string seen = "for i in {1..400}; do [ -s out ] && break; sleep 0.05; done\n";
+        const Outcome outcome = watch("", change("eth0", status) + seen + kill);
         EXPECT_EQ(outcome.exitCode, 0) << signal << outcome.err;
         EXPECT_THAT(linesOf(outcome.out), SizeIs(1)) << signal;
         EXPECT_EQ(outcome.err, "marlo: watching; interrupt to end\n") << signal;
