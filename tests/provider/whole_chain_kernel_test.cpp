@@ -24,6 +24,12 @@ std::vector<std::string> taken(WholeChain& chain, std::size_t count) {
     return events;
 }
 
+/** Ends when the interface is up: the kernel announces a carrier some time after the command that brings it. */
+void awaitUp(const Namespace& space, const std::string& interface) {
+    space.shell("timeout 10 sh -c 'until ip -o link show " + interface +
+                " | grep -q \"state UP\"; do sleep 0.01; done'");
+}
+
 const std::string ONLINE = " MARLO_NetworkAdapterOnlineEvent";
 const std::string OFFLINE = " MARLO_NetworkAdapterOfflineEvent";
 
@@ -34,6 +40,8 @@ TEST(WholeChainOnTheKernel, CarrierAdministrationAndDeletionReachTheSubscriber) 
     space.ip("link add eth0 type veth peer name far0");
     space.ip("link set eth0 up");
     space.ip("link set far0 up");
+    awaitUp(space, "eth0");
+    awaitUp(space, "far0");
     std::unique_ptr<WholeChain> chain;
     space.run([&] { chain = std::make_unique<WholeChain>(); });
     EXPECT_THAT(taken(*chain, 0), testing::IsEmpty());
