@@ -94,10 +94,11 @@ TEST_F(ProcessTest, KeepsFailuresOnTheStandardErrorStreamAndNoTraceByDefault) {
 
 /** A daemon that goes into the background leaves the threads of the library behind. */
 TEST_F(ProcessTest, MonitorsInAForkedProcessToo) {
-    // ThreadSanitizer wants to be told that threads after a fork are meant.
-    const Outcome outcome =
-        probe("TSAN_OPTIONS=die_after_fork=0 " + configured("") + " ORV_AGENT_TREE='" + tree.path() + "'",
-              "watch 12 fork watch 5");
+    // ThreadSanitizer wants to be told that threads after a fork are meant, and the leak check that the memory of the
+    // threads left behind is nobody's.
+    const Outcome outcome = probe("TSAN_OPTIONS=die_after_fork=0 ASAN_OPTIONS=$ASAN_OPTIONS:detect_leaks=0 " +
+                                      configured("") + " ORV_AGENT_TREE='" + tree.path() + "'",
+                                  "watch 12 fork watch 5");
     EXPECT_EQ(outcome.exitCode, 0) << outcome.errors;
     EXPECT_EQ(outcome.output, "event: 12\nevent: 5\n");
 }
