@@ -103,7 +103,8 @@ static const char* exercise_services(const CMPIBroker* broker, const CMPIContext
     EXPECT(CMLogMessage(broker, CMPI_SEV_INFO, "exercise", "logged", NULL).rc == CMPI_RC_OK);
     EXPECT(CMTraceMessage(broker, CMPI_LEV_INFO, "exercise", "traced", NULL).rc == CMPI_RC_OK);
     EXPECT(CMNewSelectExp(broker, "SELECT * FROM Test_Thing", "WQL", NULL, &status) != NULL);
-    EXPECT(CMNewSelectExp(broker, "no query", "WQL", NULL, &status) == NULL && status.rc == CMPI_RC_ERR_INVALID_QUERY);
+    EXPECT(CMNewSelectExp(broker, "no query", "WQL", NULL, &status) == NULL &&
+           status.rc == CMPI_RC_ERR_INVALID_QUERY);
     return NULL;
 }
 
