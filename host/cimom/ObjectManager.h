@@ -38,6 +38,14 @@ struct MethodAnswer {
     std::vector<NamedValue> out;
 };
 
+/** Which associations to follow; an empty name stands for any. */
+struct AssociationFilter {
+    std::string associationClass;
+    std::string resultClass; ///< of what is at the other end; of `references`: unused
+    std::string role;        ///< the reference of the association that points at the start
+    std::string resultRole;  ///< the reference that points at the other end
+};
+
 /** Tells a subscription from every other one of its object manager; 0 is none. */
 using SubscriptionId = std::uint64_t;
 
@@ -50,6 +58,21 @@ struct ObjectManagerOptions {
     std::function<void(const std::string& line)> log;
     bool trace = false; ///< the log receives what providers trace as well
 };
+
+/** In whose name this thread asks for operations, as CMPIPrincipal tells providers; else the user that the process
+ * works for. */
+class ActingFor {
+  public:
+    explicit ActingFor(std::string principal);
+    ~ActingFor();
+    ActingFor(const ActingFor&) = delete;
+    ActingFor& operator=(const ActingFor&) = delete;
+
+  private:
+    std::string _former;
+};
+
+class BuiltIn;
 
 /**
  * One object manager. Operations may be called from any thread, concurrently. What providers throw is answered
@@ -101,6 +124,38 @@ class ObjectManager {
      */
     Status invokeMethod(const ObjectPath& path, const std::string& method, const std::vector<NamedValue>& arguments,
                         MethodAnswer& answer);
+
+    /**
+     * Makes an instance of a class, with the keys that the instance's properties or path have; `created` is its path,
+     * complete, with namespace and without host. A property that has a default and is not given gets it.
+     */
+    Status createInstance(const Instance& instance, ObjectPath& created);
+
+    /** Removes the instance at a path with all its keys. */
+    Status deleteInstance(const ObjectPath& path);
+
+    /**
+     * Those of what enumerateInstances gives for the class of a SELECT statement ("WQL", "CQL", "CIM:CQL",
+     * "DMTF:CQL") that its condition holds for, each with the selected properties and a complete path.
+     */
+    Status execQuery(const std::string& nameSpace, const std::string& query, const std::string& language,
+                     const InstanceSink& sink);
+
+    /**
+     * What is associated with the instance at a path: the instances at the other ends, their paths, the associations
+     * themselves, their paths. Found among the instances of all association classes that somebody serves; nothing
+     * where there are none. A class or a role that does not exist is refused.
+     */
+    Status associators(const ObjectPath& path, const AssociationFilter& filter, const PropertyList& properties,
+                       const InstanceSink& sink);
+    Status associatorNames(const ObjectPath& path, const AssociationFilter& filter, const PathSink& sink);
+    Status references(const ObjectPath& path, const AssociationFilter& filter, const PropertyList& properties,
+                      const InstanceSink& sink);
+    Status referenceNames(const ObjectPath& path, const AssociationFilter& filter, const PathSink& sink);
+
+    /** Has the object manager serve classes by itself. Before the first request; throws std::runtime_error for a
+     * class that the schema lacks or that a provider serves. */
+    void add(std::shared_ptr<BuiltIn> builtIn);
 
     /** Receives an indication on the thread that delivers it; several at once when several deliver. */
     using IndicationSink = std::function<void(Instance&& indication)>;

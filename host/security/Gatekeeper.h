@@ -1,0 +1,83 @@
+/**
+ * @file
+ * Tells who is asking from what a request brings along.
+ */
+#pragma once
+
+#include "host/http/Message.h"
+#include "host/security/Identity.h"
+
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace marlo::security {
+
+/** Users, and groups of the system as "@name"; "*" is everyone who has an account. */
+struct Access {
+    std::vector<std::string> read;
+    std::vector<std::string> change;    ///< may read as well
+    std::vector<std::string> subscribe; ///< may read as well
+};
+
+/** Whether a name and a password are of an account that may log in. May take its time; any thread. */
+class PasswordCheck {
+  public:
+    virtual ~PasswordCheck() = default;
+    [[nodiscard]] virtual bool isGood(const std::string& user, const std::string& password) = 0;
+
+  protected:
+    PasswordCheck() = default;
+    PasswordCheck(const PasswordCheck&) = default;
+    PasswordCheck& operator=(const PasswordCheck&) = default;
+};
+
+/** The accounts of the system, through PAM (pam(3)) with a service's rules. */
+std::unique_ptr<PasswordCheck> makePamCheck(const std::string& service);
+
+struct GatekeeperOptions {
+    Access access;
+    std::shared_ptr<PasswordCheck> accounts; ///< none: no system accounts
+    std::string trialUser;                   ///< with the password below it may do everything; empty: there is none
+    std::string trialPassword;
+    std::string realm = "marlo";
+    std::chrono::milliseconds failureDelay{500}; ///< of the first failure of a peer; grows with each
+};
+
+/** What came of looking at a request. */
+struct Admission {
+    Identity identity;                   ///< nobody where `refusal` is set
+    std::optional<http::Answer> refusal; ///< 401 with WWW-Authenticate
+};
+
+/**
+ * The one place where an identity comes from. On TCP and TLS: Basic credentials (RFC 7617) of one well-formed
+ * Authorization field, or a verified client certificate whose common name is a user. On a Unix domain socket: the
+ * peer's user id; root and the user that the server runs as may do everything, others what the access says.
+ * Any thread.
+ */
+class Gatekeeper {
+  public:
+    Gatekeeper(GatekeeperOptions options, std::function<void(const std::string&)> log);
+    ~Gatekeeper();
+    Gatekeeper(const Gatekeeper&) = delete;
+    Gatekeeper& operator=(const Gatekeeper&) = delete;
+
+    /** Failures are slowed down, before they are answered, and logged with the peer. */
+    [[nodiscard]] Admission admit(const http::RequestHead& head, const http::Peer& peer);
+
+    /** Other users from now on. */
+    void setAccess(const Access& access);
+
+  private:
+    struct State;
+    std::unique_ptr<State> _state;
+};
+
+/** A password of 128 random bits in letters and digits, for a session of trying things. */
+std::string makePassword();
+
+} // namespace marlo::security
