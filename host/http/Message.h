@@ -5,6 +5,7 @@
 #pragma once
 
 #include <any>
+#include <chrono>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -62,6 +63,8 @@ struct Answer {
     Fields fields;
     std::string body;
     bool close = false; ///< the connection ends with this answer
+    /** It is held back this long, by a timer and not by a worker: many who guess passwords keep nobody waiting. */
+    std::chrono::milliseconds delay{0};
 };
 
 } // namespace marlo::http

@@ -84,10 +84,13 @@ struct Limits {
     std::size_t connections = 1024;                       ///< of all peers
     std::size_t connectionsPerPeer = 256;                 ///< of one address, or one user of the local socket
     std::size_t workers = 16;                             ///< requests that are handled at once
-    std::chrono::milliseconds headTime{10000};            ///< from the first byte to the end of the head
-    std::chrono::milliseconds bodyTime{30000};            ///< of the whole body
-    std::chrono::milliseconds idleTime{60000};            ///< between two requests
-    std::chrono::milliseconds sendTime{30000};            ///< for a client to take the next piece of an answer
+    std::size_t queued = 256;                             ///< requests that wait for a worker; 503 beyond
+    std::size_t drained = std::size_t{64} * 1024; ///< of the body of a refused request; its connection is kept
+    std::chrono::milliseconds headTime{10000};    ///< from the first byte to the end of the head
+    std::chrono::milliseconds bodyTime{30000};    ///< of the whole body
+    std::chrono::milliseconds idleTime{60000};    ///< between two requests
+    std::chrono::milliseconds sendTime{30000};    ///< for a client to take the next piece of an answer
+    std::chrono::milliseconds lingerTime{5000};   ///< for a client that still sends to see the last answer
 };
 
 /** A TLS identity and whom to trust; PEM files. */
@@ -102,6 +105,7 @@ struct Endpoint {
     Transport transport = Transport::tcp;
     std::string address = "127.0.0.1"; ///< numeric, or the path of a Unix domain socket
     unsigned short port = 0;           ///< 0: one that is free
+    unsigned mode = 0666;              ///< of the Unix domain socket; who may do what is the handler's business
 };
 
 struct Counters {
@@ -127,6 +131,12 @@ class Server {
     ~Server();
     Server(const Server&) = delete;
     Server& operator=(const Server&) = delete;
+
+    /**
+     * Serves a connection that exists already, until it ends. The descriptor of a stream socket goes over to the
+     * server. `peer` is what the handler is told; its transport says whether TLS is spoken.
+     */
+    void serve(int descriptor, Peer peer);
 
     /** Where it listens, with the ports that were free. */
     [[nodiscard]] std::vector<Endpoint> endpoints() const;
