@@ -23,7 +23,7 @@ CMPIrc addEntry(ContextObject& context, const char* name, const CMPIValue* value
 
 /** A context prepared for a thread is the broker's until it is released or detached, whichever is first. */
 CMPIStatus releaseContext(CMPIContext* handle) {
-    ContextObject* context = objectOf<ContextObject>(handle);
+    auto* context = objectOf<ContextObject>(handle);
     if (context != nullptr && context->preparedBy != nullptr) {
         context->preparedBy->releasePrepared(*context);
         return statusOf(CMPI_RC_OK);

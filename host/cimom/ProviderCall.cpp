@@ -129,7 +129,7 @@ Status ProviderCall::invokeMethod(const ObjectPath& path, const std::string& met
                                   const std::vector<NamedValue>& arguments, MethodAnswer& answer) {
     Collector collector;
     bool isDone = false;
-    const Status status = collector.statusOf(call(
+    Status status = collector.statusOf(call(
         path, std::nullopt, collector,
         [&](const Arguments& prepared) {
             CMPIMethodMI& mi = _provider.methodMI(*prepared.context);

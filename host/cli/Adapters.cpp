@@ -173,6 +173,7 @@ ExitCode printTable(AdapterList& adapters, std::vector<std::string> columns, Out
     Table table(std::move(titles));
     const ExitCode code = adapters.read([&](Instance&& adapter) {
         std::vector<Cell> row;
+        row.reserve(columns.size());
         for (const std::string& column : columns) {
             row.push_back(makeCell(adapter, column));
         }

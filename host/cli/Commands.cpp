@@ -169,7 +169,8 @@ void requireProperties(const Schema& schema, const std::string& nameSpace, const
                                          [&name](const Class* each) { return each->findProperty(name) != nullptr; });
         // A class that is unknown itself is for the object manager to answer.
         if (!isKnown && !classes.empty()) {
-            throw UsageError("class " + className + " has no property \"" + name + "\"");
+            throw UsageError(std::string("class ").append(className).append(" has no property \"").append(name) +
+                             "\"");
         }
     }
 }

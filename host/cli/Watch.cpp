@@ -128,7 +128,7 @@ class Watcher {
 
     Status subscribe(const std::string& filter) {
         SubscriptionId id = 0;
-        const Status status = _manager.subscribe(
+        Status status = _manager.subscribe(
             _options.nameSpace, filter, _options.watch.language,
             [this](Instance&& indication) { _queue.push(std::move(indication)); }, id);
         if (status.ok()) {

@@ -58,7 +58,7 @@ std::string showEvent(const Instance& indication) {
 
 /** The word that the schema has for a number (ValueMap and Values); the number itself where it has none. */
 std::string showSeverity(const Schema& schema, const Instance& indication) {
-    const std::string number = textOf(indication, "PerceivedSeverity");
+    std::string number = textOf(indication, "PerceivedSeverity");
     const Class* definition = schema.findClass(indication.path.nameSpace, indication.path.className);
     const Property* property = definition == nullptr ? nullptr : definition->findProperty("PerceivedSeverity");
     if (property == nullptr) {

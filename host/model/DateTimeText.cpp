@@ -77,7 +77,7 @@ std::optional<DateTimeValue> readPoint(std::string_view digits, std::string_view
 std::string format(const char* pattern, unsigned a, unsigned b, unsigned c, unsigned d, unsigned e, unsigned f,
                    unsigned g) {
     std::array<char, 128> buffer{};
-    std::snprintf(buffer.data(), buffer.size(), pattern, a, b, c, d, e, f, g);
+    static_cast<void>(std::snprintf(buffer.data(), buffer.size(), pattern, a, b, c, d, e, f, g));
     return buffer.data();
 }
 
