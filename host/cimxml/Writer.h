@@ -71,6 +71,8 @@ class Writer {
     void className(const std::string& name);                               ///< CLASSNAME
     void classPath(const std::string& nameSpace, const std::string& name); ///< CLASSPATH in OBJECTPATH
     void classDefinition(const Class& definition, const Form& form);
+    /** CLASSPATH and CLASS in VALUE.OBJECTWITHPATH, as associations of classes give them. */
+    void classWithPath(const std::string& nameSpace, const Class& definition, const Form& form);
     void qualifierDeclaration(const QualifierType& type);
     /** VALUE, VALUE.ARRAY, VALUE.REFERENCE; nothing for NULL. For GetProperty. */
     void value(const Value& value);
