@@ -16,14 +16,17 @@
 
 namespace marlo::security {
 
-/** Users, and groups of the system as "@name"; "*" is everyone who has an account. */
+/** Users, and groups of the system as "@name"; "*" is everyone who has an account. All of them have to exist. */
 struct Access {
     std::vector<std::string> read;
     std::vector<std::string> change;    ///< may read as well
     std::vector<std::string> subscribe; ///< may read as well
 };
 
-/** Whether a name and a password are of an account that may log in. May take its time; any thread. */
+/**
+ * Whether a name and a password are of an account that may log in. May take its time, and should not tell by it; any
+ * thread. What it throws counts as no, and is logged.
+ */
 class PasswordCheck {
   public:
     virtual ~PasswordCheck() = default;
@@ -35,8 +38,11 @@ class PasswordCheck {
     PasswordCheck& operator=(const PasswordCheck&) = default;
 };
 
-/** The accounts of the system, through PAM (pam(3)) with a service's rules. */
-std::unique_ptr<PasswordCheck> makePamCheck(const std::string& service);
+/**
+ * The accounts of the system, through PAM (pam(3)) with a service's rules for "auth" and "account", from /etc/pam.d
+ * unless a directory is named. One question at a time in the whole process: modules need not be fit for threads.
+ */
+std::unique_ptr<PasswordCheck> makePamCheck(const std::string& service, const std::string& directory = {});
 
 struct GatekeeperOptions {
     Access access;
@@ -50,26 +56,32 @@ struct GatekeeperOptions {
 /** What came of looking at a request. */
 struct Admission {
     Identity identity;                   ///< nobody where `refusal` is set
-    std::optional<http::Answer> refusal; ///< 401 with WWW-Authenticate
+    std::optional<http::Answer> refusal; ///< 401 with WWW-Authenticate; 429 with Retry-After after too many failures
 };
 
 /**
  * The one place where an identity comes from. On TCP and TLS: Basic credentials (RFC 7617) of one well-formed
- * Authorization field, or a verified client certificate whose common name is a user. On a Unix domain socket: the
- * peer's user id; root and the user that the server runs as may do everything, others what the access says.
- * Any thread.
+ * Authorization field; where there is no such field, a verified client certificate whose common name is a user. On a
+ * Unix domain socket: the peer's user id; root and the user that the server runs as may do everything, others what
+ * the access says. Who has an account but no role is refused like a stranger.
+ *
+ * The answers to wrong credentials are held back (http::Answer::delay), those of one peer one after the other: the
+ * first by `failureDelay`, the next ones by up to eight times as much, forgiven one a minute. A peer whose answers
+ * pile up is answered 429 without a look at what it brings, unless it is the trial password. What was good at an
+ * account is remembered for half a minute. Any thread; waits for nothing but the accounts.
  */
 class Gatekeeper {
   public:
+    /** `log` is called from any thread. Throws std::runtime_error for a user or group that does not exist. */
     Gatekeeper(GatekeeperOptions options, std::function<void(const std::string&)> log);
     ~Gatekeeper();
     Gatekeeper(const Gatekeeper&) = delete;
     Gatekeeper& operator=(const Gatekeeper&) = delete;
 
-    /** Failures are slowed down, before they are answered, and logged with the peer. */
+    /** Refusals of whoever brought something are logged, with peer and user. */
     [[nodiscard]] Admission admit(const http::RequestHead& head, const http::Peer& peer);
 
-    /** Other users from now on. */
+    /** Other users from now on. Throws as the constructor does, and keeps what it had. */
     void setAccess(const Access& access);
 
   private:
