@@ -18,6 +18,7 @@ namespace marlo::cimxml {
 struct Form {
     bool qualifiers = false;
     bool classOrigin = false;
+    bool operator==(const Form&) const = default;
 };
 
 /** How an instance is wrapped. */
@@ -62,10 +63,14 @@ class Writer {
 
     /** From the XML declaration to the opened METHODRESPONSE. */
     void beginExtrinsic(const std::string& messageId, const std::string& method);
-    void returnValue(const Value& value); ///< RETURNVALUE with PARAMTYPE
+    void returnValue(const Value& value); ///< RETURNVALUE with PARAMTYPE; nothing for NULL
     void endExtrinsic();
 
-    /** `definition` gives qualifiers, class origins and types of arrays; its names are the instance's. */
+    /**
+     * `definition` gives qualifiers, class origins and the classes of references; null where there is none. It lives
+     * and stays as it is until this writer is gone: what all instances of a class have in common is written once and
+     * kept.
+     */
     void instance(const Instance& instance, Wrap wrap, const Class* definition, const Form& form);
     void path(const ObjectPath& path, PathWrap wrap);
     void className(const std::string& name);                               ///< CLASSNAME
