@@ -14,12 +14,12 @@ namespace Orv::Agent {
 
 /** The event code that a monitoring callback gets. */
 enum class EventCode : unsigned int {
-    status = 0,  ///< the adapter's status is another, or a bond has moved to another member
+    status = 0,  ///< the adapter's status is another, or a bond or team has moved to another member
     address = 1, ///< an IP address, the IPv4 mask or the link-layer address is another
     name = 2     ///< the adapter's name is another
 };
 
-/** PROP_STATUS of an event that is no state of the adapter: a bond works before and after it. */
+/** PROP_STATUS of an event that is no state of the adapter: a bond or team works before and after it. */
 enum class FailOver : unsigned int {
     switchOver = 32, ///< it moved to a backup member
     switchBack = 33  ///< it returned to its primary member

@@ -1,6 +1,8 @@
 #include "agent/file/FileWatch.h"
 
+#include "agent/config/Descriptor.h"
 #include "agent/events/Differences.h"
+#include "agent/events/WaitSet.h"
 #include "agent/file/ControlPipe.h"
 #include "agent/file/Script.h"
 
@@ -14,7 +16,6 @@
 #include <system_error>
 #include <utility>
 
-#include <sys/epoll.h>
 #include <sys/inotify.h>
 #include <unistd.h>
 
@@ -22,29 +23,13 @@ namespace Orv::Agent {
 
 namespace {
 
-class Descriptor {
-  public:
-    Descriptor(int number, const char* what) : _number(number) {
-        if (number < 0) {
-            throw std::system_error(errno, std::generic_category(), what);
-        }
-    }
-
-    ~Descriptor() { ::close(_number); }
-
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-
-    [[nodiscard]] int number() const { return _number; }
-
-  private:
-    int _number;
-};
-
 /** Tells when a file is complete again: closed by who wrote it, or replaced by a rename. */
 class FileNotifier {
   public:
-    explicit FileNotifier(const std::string& path) : _inotify(::inotify_init1(IN_CLOEXEC | IN_NONBLOCK), "inotify") {
+    explicit FileNotifier(const std::string& path) : _inotify(::inotify_init1(IN_CLOEXEC | IN_NONBLOCK)) {
+        if (!_inotify) {
+            throw std::system_error(errno, std::generic_category(), "inotify");
+        }
         std::error_code ignored;
         watch(path);
         watch(std::filesystem::canonical(path, ignored)); // where it is a link: what it leads to
@@ -87,16 +72,16 @@ class FileNotifier {
 class FileWatch : public EventWatch {
   public:
     FileWatch(BackEnd& backEnd, const std::string& path, const std::string& control, EventSink& sink)
-        : _backEnd(backEnd), _sink(sink), _notifier(path), _poll(::epoll_create1(EPOLL_CLOEXEC), "epoll") {
-        add(_notifier.descriptor());
+        : _backEnd(backEnd), _sink(sink), _notifier(path) {
+        _sources.add(_notifier.descriptor());
         if (!control.empty()) {
             _control.emplace(control);
-            add(_control->descriptor());
+            _sources.add(_control->descriptor());
         }
         _known = _backEnd.snapshot();
     }
 
-    [[nodiscard]] int descriptor() const override { return _poll.number(); }
+    [[nodiscard]] int descriptor() const override { return _sources.descriptor(); }
 
     void collect() override {
         _isStale = _notifier.takeChange() || _isStale;
@@ -111,14 +96,6 @@ class FileWatch : public EventWatch {
     }
 
   private:
-    void add(int descriptor) {
-        epoll_event event{};
-        event.events = EPOLLIN;
-        if (::epoll_ctl(_poll.number(), EPOLL_CTL_ADD, descriptor, &event) != 0) {
-            throw std::system_error(errno, std::generic_category(), "epoll");
-        }
-    }
-
     void post(std::vector<Event> events) {
         for (Event& event : events) {
             _sink.post(std::move(event));
@@ -145,7 +122,7 @@ class FileWatch : public EventWatch {
     EventSink& _sink;
     FileNotifier _notifier;
     std::optional<ControlPipe> _control;
-    Descriptor _poll;
+    WaitSet _sources;
     std::shared_ptr<const Tree> _known; ///< the last state that was reported
     bool _isStale = false;
 };

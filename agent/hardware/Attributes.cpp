@@ -6,19 +6,38 @@
 
 namespace Orv::Agent::Hardware {
 
+struct Attributes::Attribute {
+    std::uint16_t type;
+    Bytes payload;
+};
+
+/** Takes the first attribute off the row; none when what is left of it holds no whole one. */
+std::optional<Attributes::Attribute> Attributes::takeFirst(Bytes& row) {
+    const auto header = leadingHeader<nlattr>(row);
+    if (!header || header->nla_len < sizeof(nlattr) || header->nla_len > row.size()) {
+        return std::nullopt;
+    }
+    const Bytes payload = row.subspan(sizeof(nlattr), header->nla_len - sizeof(nlattr));
+    const std::size_t step = NLA_ALIGN(std::size_t{header->nla_len});
+    row = row.subspan(std::min(step, row.size()));
+    return Attribute{static_cast<std::uint16_t>(header->nla_type & NLA_TYPE_MASK), payload};
+}
+
 std::optional<Bytes> Attributes::find(std::uint16_t type) const {
     Bytes rest = _bytes;
-    while (const auto attribute = leadingHeader<nlattr>(rest)) {
-        if (attribute->nla_len < sizeof(nlattr) || attribute->nla_len > rest.size()) {
-            break;
+    while (const auto attribute = takeFirst(rest)) {
+        if (attribute->type == type) {
+            return attribute->payload;
         }
-        if ((attribute->nla_type & NLA_TYPE_MASK) == type) {
-            return rest.subspan(sizeof(nlattr), attribute->nla_len - sizeof(nlattr));
-        }
-        const std::size_t step = NLA_ALIGN(std::size_t{attribute->nla_len});
-        rest = rest.subspan(std::min(step, rest.size()));
     }
     return std::nullopt;
+}
+
+void Attributes::forEach(const std::function<void(std::uint16_t type, Bytes payload)>& visit) const {
+    Bytes rest = _bytes;
+    while (const auto attribute = takeFirst(rest)) {
+        visit(attribute->type, attribute->payload);
+    }
 }
 
 std::optional<std::string> Attributes::text(std::uint16_t type) const {

@@ -7,6 +7,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <functional>
 #include <optional>
 #include <span>
 #include <string>
@@ -46,7 +47,14 @@ class Attributes {
     /** The attributes inside a nest; an empty row when there is none. */
     [[nodiscard]] Attributes nested(std::uint16_t type) const;
 
+    /** Gives every attribute's type, without its flags, and payload, in their order. */
+    void forEach(const std::function<void(std::uint16_t type, Bytes payload)>& visit) const;
+
   private:
+    struct Attribute;
+
+    static std::optional<Attribute> takeFirst(Bytes& row);
+
     Bytes _bytes;
 };
 

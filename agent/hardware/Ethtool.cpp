@@ -2,9 +2,11 @@
 
 #include "agent/hardware/EthtoolIoctl.h"
 #include "agent/hardware/EthtoolMessages.h"
+#include "agent/hardware/GenericFamily.h"
 
 #include <system_error>
 
+#include <linux/ethtool_netlink.h>
 #include <linux/netlink.h>
 
 namespace Orv::Agent::Hardware {
@@ -12,10 +14,14 @@ namespace Orv::Agent::Hardware {
 namespace {
 
 std::optional<std::uint16_t> findFamily(NetlinkSocket& socket) {
-    auto request = familyRequest();
-    std::optional<std::uint16_t> family;
-    socket.ask(request, [&](Bytes payload) { family = parseFamily(payload); });
-    return family;
+    auto request = familyRequest(ETHTOOL_GENL_NAME);
+    std::optional<std::uint16_t> type;
+    socket.ask(request, [&](Bytes payload) {
+        if (const auto family = parseFamily(payload)) {
+            type = family->type;
+        }
+    });
+    return type;
 }
 
 /** What the dumps tell; false when they do not tell it all. */

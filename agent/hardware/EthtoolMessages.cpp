@@ -49,19 +49,6 @@ std::vector<std::uint32_t> bitSetMask(const Attributes& bitSet) {
 
 } // namespace
 
-NetlinkRequest familyRequest() {
-    NetlinkRequest request(GENL_ID_CTRL, 0);
-    auto& header = request.put<genlmsghdr>();
-    header.cmd = CTRL_CMD_GETFAMILY;
-    header.version = 1;
-    mnl_attr_put_strz(&request.message(), CTRL_ATTR_FAMILY_NAME, ETHTOOL_GENL_NAME);
-    return request;
-}
-
-std::optional<std::uint16_t> parseFamily(Bytes payload) {
-    return attributesBehind<genlmsghdr>(payload).number<std::uint16_t>(CTRL_ATTR_FAMILY_ID);
-}
-
 NetlinkRequest linkModesRequest(std::uint16_t family) {
     return dumpRequest(family, ETHTOOL_MSG_LINKMODES_GET, ETHTOOL_A_LINKMODES_HEADER);
 }

@@ -1,7 +1,7 @@
 /**
  * @file
- * Messages of the generic netlink family "ethtool" (kernel: Documentation/networking/ethtool-netlink.rst), and the
- * question for its number. Payloads begin with struct genlmsghdr.
+ * Messages of the generic netlink family "ethtool" (kernel: Documentation/networking/ethtool-netlink.rst). Payloads
+ * begin with struct genlmsghdr.
  */
 #pragma once
 
@@ -21,12 +21,6 @@ struct InterfaceSettings {
 
     bool operator==(const InterfaceSettings&) const = default;
 };
-
-/** CTRL_CMD_GETFAMILY for the family. */
-NetlinkRequest familyRequest();
-
-/** The family's message type from the answer. */
-std::optional<std::uint16_t> parseFamily(Bytes payload);
 
 /** A dump of ETHTOOL_MSG_LINKMODES_GET over all interfaces, with compact bit sets. */
 NetlinkRequest linkModesRequest(std::uint16_t family);

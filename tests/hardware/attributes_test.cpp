@@ -49,6 +49,17 @@ TEST(Attributes, EndAtALengthBelowAHeader) {
     EXPECT_FALSE(Attributes(message.bytes()).find(2));
 }
 
+TEST(Attributes, AreVisitedInTheirOrderUpToWhatDoesNotFit) {
+    auto message = MessageBytes().text(2, "a").nest(2, MessageBytes().text(1, "b")).number(1, std::uint8_t{7});
+    message.attribute(3, "cut", 3);
+    std::vector<std::pair<int, std::size_t>> visited;
+    const Bytes bytes = message.bytes();
+    Attributes(bytes.first(bytes.size() - 2)).forEach([&](std::uint16_t type, Bytes payload) {
+        visited.emplace_back(type, payload.size());
+    });
+    EXPECT_EQ(visited, (std::vector<std::pair<int, std::size_t>>{{2, 2}, {2, 8}, {1, 1}}));
+}
+
 TEST(Attributes, OfAMissingNestAreNone) {
     EXPECT_FALSE(Attributes(Bytes()).nested(1).find(1));
 }

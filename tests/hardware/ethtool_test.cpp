@@ -1,5 +1,6 @@
 #include "agent/hardware/EthtoolIoctl.h"
 #include "agent/hardware/EthtoolMessages.h"
+#include "agent/hardware/GenericFamily.h"
 #include "tests/hardware/MessageBytes.h"
 
 #include <array>
@@ -86,11 +87,21 @@ TEST(LinkInfoReply, TellsTheConnector) {
     EXPECT_EQ(read->settings.port, PORT_FIBRE);
 }
 
-TEST(FamilyReply, TellsTheMessageType) {
+TEST(FamilyReply, TellsTheMessageTypeAndTheGroups) {
+    const auto group = [](const char* name, std::uint32_t number) {
+        return MessageBytes().number(CTRL_ATTR_MCAST_GRP_ID, number).text(CTRL_ATTR_MCAST_GRP_NAME, name);
+    };
     const auto message = MessageBytes(genlmsghdr{CTRL_CMD_NEWFAMILY, 2, 0})
-                             .text(CTRL_ATTR_FAMILY_NAME, "ethtool")
-                             .number(CTRL_ATTR_FAMILY_ID, std::uint16_t{20});
-    EXPECT_EQ(parseFamily(message.bytes()), 20);
+                             .text(CTRL_ATTR_FAMILY_NAME, "family")
+                             .number(CTRL_ATTR_FAMILY_ID, std::uint16_t{20})
+                             .nest(CTRL_ATTR_MCAST_GROUPS, MessageBytes()
+                                                               .nest(1, group("some", 7))
+                                                               .nest(2, MessageBytes().text(1, "nameless"))
+                                                               .nest(3, group("others", 8)));
+    EXPECT_EQ(parseFamily(message.bytes()), (GenericFamily{20, {{"some", 7}, {"others", 8}}}));
+}
+
+TEST(FamilyReply, WithoutANumberIsNone) {
     EXPECT_FALSE(parseFamily(MessageBytes(genlmsghdr{CTRL_CMD_NEWFAMILY, 2, 0}).bytes()));
     EXPECT_FALSE(parseFamily(Bytes()));
 }
