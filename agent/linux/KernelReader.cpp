@@ -67,11 +67,15 @@ Request neighbourRequest(const GatewayKey& gateway) {
 
 } // namespace
 
-KernelReader::KernelReader(int receiveBytes) : _notifications(receiveBytes) {
+KernelReader::KernelReader(int receiveBytes) : _notifications(receiveBytes), _teams(receiveBytes) {
     _notifications.ignoreOtherRoutes();
     for (const int group :
          {RTNLGRP_LINK, RTNLGRP_IPV4_IFADDR, RTNLGRP_IPV6_IFADDR, RTNLGRP_IPV4_ROUTE, RTNLGRP_IPV6_ROUTE}) {
         _notifications.subscribe(group);
+    }
+    _sources.add(_notifications.descriptor());
+    if (_teams.descriptor() >= 0) {
+        _sources.add(_teams.descriptor());
     }
     update();
 }
@@ -80,6 +84,7 @@ const KernelState& KernelReader::follow() {
     if (!drain()) {
         readAll();
     }
+    watchTeams();
     return _state;
 }
 
@@ -103,15 +108,20 @@ void KernelReader::step() {
 /** Applies what waits. False when the tables are not to be relied on. */
 bool KernelReader::drain(const std::function<void(const Message&)>& alsoTo) {
     const bool complete = std::exchange(_complete, false);
-    const auto apply = [&](const nlmsghdr& message) {
-        const Message parsed = parseMessage(message);
+    const auto apply = [&](const Message& message) {
         if (alsoTo) {
-            alsoTo(parsed);
+            alsoTo(message);
         }
-        _state.apply(parsed);
+        _state.apply(message);
         step();
     };
-    _complete = _notifications.drain(apply) == NotificationSocket::Drain::complete && complete;
+    // Received before the links' messages and applied behind them: those that were sent first have come by then.
+    std::vector<Message> ofTeams;
+    const auto teams = _teams.drain([&](const Message& message) { ofTeams.push_back(message); });
+    const auto links = _notifications.drain([&](const nlmsghdr& message) { apply(parseMessage(message)); });
+    std::for_each(ofTeams.begin(), ofTeams.end(), apply);
+    _complete =
+        complete && teams == NotificationSocket::Drain::complete && links == NotificationSocket::Drain::complete;
     return _complete;
 }
 
@@ -145,7 +155,26 @@ bool KernelReader::readTables(KernelState& state) {
     Request addresses = addressRequest();
     const auto linkDump = _requests.dump(links.message(), "reading the links", load);
     const auto addressDump = _requests.dump(addresses.message(), "reading the addresses", load);
+    readTeams(state);
     return linkDump == RequestSocket::Dump::consistent && addressDump == RequestSocket::Dump::consistent;
+}
+
+/** A team that vanishes meanwhile says nothing, which is how its link's end finds it. */
+void KernelReader::readTeams(KernelState& state) {
+    for (const int team : state.teams()) {
+        _teams.read(team, [&](const Message& message) { state.apply(message); });
+    }
+    _teamsRead = state.hasTeams();
+}
+
+/** The first team there is brings its driver with it; of those that come later the driver then tells everything. */
+void KernelReader::watchTeams() {
+    if (!_state.hasTeams()) {
+        _teamsRead = false;
+    } else if (!_teamsRead) {
+        readTeams(_state);
+        step();
+    }
 }
 
 void KernelReader::readRoutes(std::uint8_t family) {

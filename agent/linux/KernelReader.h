@@ -4,8 +4,10 @@
  */
 #pragma once
 
+#include "agent/events/WaitSet.h"
 #include "agent/linux/KernelState.h"
 #include "agent/linux/NetlinkSocket.h"
+#include "agent/linux/TeamSocket.h"
 
 #include <functional>
 #include <set>
@@ -15,6 +17,11 @@ namespace Orv::Agent::Linux {
 /**
  * The tables of the namespace in which it was made. One thread at a time. Operations throw std::system_error, and
  * what failed is done again by the next.
+ *
+ * The kernel speaks through two sockets, rtnetlink and, where there are teams, the family "team". The messages of
+ * each are applied in the order in which they were sent. Between the two there is one guarantee: when what a team
+ * says is applied, so is all that rtnetlink sent before it. A port that loses its carrier thus comes before the move
+ * of its team that it causes. Of what rtnetlink sent later, some may have been applied as well.
  */
 class KernelReader {
   public:
@@ -46,7 +53,7 @@ class KernelReader {
     [[nodiscard]] const KernelState& state() const { return _state; }
 
     /** Becomes readable when the kernel has something to tell. */
-    [[nodiscard]] int descriptor() const { return _notifications.descriptor(); }
+    [[nodiscard]] int descriptor() const { return _sources.descriptor(); }
 
     /** The interfaces that changed since the last call, also those that are gone. */
     std::set<int> takeChanges() { return _state.takeChanges(); }
@@ -57,6 +64,8 @@ class KernelReader {
   private:
     void readAll();
     bool readTables(KernelState& state);
+    void readTeams(KernelState& state);
+    void watchTeams();
     void readRoutes(std::uint8_t family);
     void watchNeighbours();
     void readNeighbour(const GatewayKey& gateway);
@@ -65,11 +74,14 @@ class KernelReader {
 
     NotificationSocket _notifications;
     RequestSocket _requests;
+    TeamSocket _teams;
+    WaitSet _sources;
     KernelState _state;
     Step _step;
     std::set<GatewayKey> _knownGateways; ///< the contested ones whose neighbour entry has been read
     bool _neighboursSubscribed = false;
-    bool _complete = false; ///< everything was read and no notification lost since
+    bool _teamsRead = false; ///< their options have been read, and no change lost since
+    bool _complete = false;  ///< everything was read and no notification lost since
     unsigned _fullReads = 0;
 };
 

@@ -58,6 +58,8 @@ void KernelState::apply(const Message& message) {
         void operator()(const Change<Route>& change) const { state.applyRoute(change); }
 
         void operator()(const Change<Neighbour>& change) const { state.applyNeighbour(change); }
+
+        void operator()(const TeamOptions& options) const { state.applyTeam(options); }
     };
 
     std::visit(Visitor{*this}, message);
@@ -85,12 +87,16 @@ void KernelState::applyLink(const Change<Link>& change) {
         markRoutesStale();
     }
     link = change.object;
+    if (link.kind == "team") {
+        _teams[link.index];
+    }
     _changed.insert(link.index);
 }
 
 void KernelState::removeLink(int index) {
     _links.erase(index);
     _addresses.erase(index);
+    _teams.erase(index);
     markRoutesStale();
     _changed.insert(index);
 }
@@ -183,6 +189,51 @@ void KernelState::applyNeighbour(const Change<Neighbour>& change) {
     if (changed) {
         _changed.insert(gateway.first);
     }
+}
+
+/** The last words of a team may come after its link is gone, and are none about the next of that index. */
+void KernelState::applyTeam(const TeamOptions& options) {
+    const auto known = _teams.find(options.index);
+    if (known == _teams.end()) {
+        return;
+    }
+    Team team = known->second;
+    team.activePort = options.activePort.value_or(team.activePort);
+    for (const auto& [port, priority] : options.priorities) {
+        if (priority) {
+            team.priorities[port] = *priority;
+        } else {
+            team.priorities.erase(port);
+        }
+    }
+    if (known->second != team) {
+        known->second = std::move(team);
+        _changed.insert(options.index);
+    }
+}
+
+std::vector<int> KernelState::teams() const {
+    std::vector<int> indexes;
+    for (const auto& team : _teams) {
+        indexes.push_back(team.first);
+    }
+    return indexes;
+}
+
+Carrier KernelState::carrierOf(const Link& link) const {
+    const auto team = _teams.find(link.index);
+    if (team == _teams.end()) {
+        const bool isNamed = link.activeMember != 0 && link.activeMember == link.primaryMember;
+        return {link.activeMember, isNamed ? Carrier::Rank::named : Carrier::Rank::backup};
+    }
+    const auto& priorities = team->second.priorities;
+    const auto active = priorities.find(team->second.activePort);
+    if (active == priorities.end()) {
+        return {}; // a port that is leaving
+    }
+    const bool isFirst = std::all_of(priorities.begin(), priorities.end(),
+                                     [&](const auto& port) { return port.second <= active->second; });
+    return {active->first, isFirst ? Carrier::Rank::first : Carrier::Rank::backup};
 }
 
 const KernelState::Addresses& KernelState::addressesOf(int index) const {

@@ -25,6 +25,21 @@ struct DefaultRoute {
     bool operator==(const DefaultRoute&) const = default;
 };
 
+/** The member that carries a bond or a team. */
+struct Carrier {
+    /** How the member stands to the others. */
+    enum class Rank {
+        backup,
+        first, ///< none has a higher priority, as many as there may be of the same
+        named, ///< the one that the bond is told to prefer
+    };
+
+    int member = 0; ///< 0 when none carries it, or all do
+    Rank rank = Rank::backup;
+
+    bool operator==(const Carrier&) const = default;
+};
+
 /** A gateway as the neighbour tables know it. */
 using GatewayKey = std::pair<int, IpAddress>;
 
@@ -63,6 +78,15 @@ class KernelState {
 
     [[nodiscard]] const std::map<int, Link>& links() const { return _links; }
 
+    /** Whether there is a team, of which only the driver's own messages tell who carries it. */
+    [[nodiscard]] bool hasTeams() const { return !_teams.empty(); }
+
+    /** The teams, by index. */
+    [[nodiscard]] std::vector<int> teams() const;
+
+    /** What carries the interface, if it is a bond or a team. */
+    [[nodiscard]] Carrier carrierOf(const Link& link) const;
+
     /** In the kernel's order; both families mixed. */
     [[nodiscard]] const Addresses& addressesOf(int index) const;
 
@@ -82,12 +106,22 @@ class KernelState {
     void applyAddress(const Change<Address>& change);
     void applyRoute(const Change<Route>& change);
     void applyNeighbour(const Change<Neighbour>& change);
+    void applyTeam(const TeamOptions& options);
     void removeLink(int index);
     void findContested();
 
     void markRoutesStale() { _staleRoutes = {true, true}; }
 
+    /** What TeamOptions have told of a team. */
+    struct Team {
+        int activePort = 0;
+        std::map<int, std::int32_t> priorities; ///< of its ports, by index
+
+        bool operator==(const Team&) const = default;
+    };
+
     std::map<int, Link> _links;
+    std::map<int, Team> _teams; ///< an entry for every link of that kind
     std::map<int, Addresses> _addresses;
     std::map<int, DefaultRoutes> _routes;
     std::set<GatewayKey> _contested;

@@ -7,20 +7,22 @@
 
 namespace Orv::Agent::Linux {
 
-std::optional<FailOver> BondMoves::take(const Link& link) {
-    if (link.activeMember == 0) {
+std::optional<FailOver> CarrierMoves::take(int index, const Carrier& carrier) {
+    if (carrier.member == 0) {
         return std::nullopt;
     }
-    const int before = std::exchange(_carriers[link.index], link.activeMember);
-    if (before == 0 || before == link.activeMember) {
+    const Carrier before = std::exchange(_carriers[index], carrier);
+    if (before.member == 0 || before.member == carrier.member) {
         return std::nullopt;
     }
-    return link.activeMember == link.primaryMember ? FailOver::switchBack : FailOver::switchOver;
+    const bool isBack = carrier.rank == Carrier::Rank::named ||
+                        (carrier.rank == Carrier::Rank::first && before.rank == Carrier::Rank::backup);
+    return isBack ? FailOver::switchBack : FailOver::switchOver;
 }
 
 LinkEvents::LinkEvents(HostTree& tree, EventSink& sink, const KernelState& state) : _tree(tree), _sink(sink) {
     for (const auto& known : state.links()) {
-        _bonds.take(known.second);
+        _moves.take(known.first, state.carrierOf(known.second));
     }
 }
 
@@ -38,12 +40,13 @@ void LinkEvents::takeInterface(int index, const KernelState& state, const HostCo
     std::vector<Tree::NodePointer> ancestors;
     if (isGone) {
         ancestors = _tree.ancestors(index, configuration);
-        _bonds.forget(index);
+        _moves.forget(index);
     }
     _tree.rebuild(state, configuration, {index});
     const Tree::NodePointer after = _tree.adapter(index);
     std::vector<Difference> found = differences(before, after);
-    if (const auto move = isGone ? std::nullopt : _bonds.take(link->second); move && after != nullptr) {
+    const auto move = isGone ? std::nullopt : _moves.take(index, state.carrierOf(link->second));
+    if (move && after != nullptr) {
         found.push_back({EventCode::status, withStatus(*after, static_cast<unsigned int>(*move))});
     }
     if (!isGone && !found.empty()) {

@@ -16,19 +16,22 @@
 namespace Orv::Agent::Linux {
 
 /**
- * Whether a bond has moved: away to another member, or to its primary one. A bond that no member carries is where it
- * was last, so one that goes down on its primary and comes up on a backup has moved; a bond that names no primary
- * only ever moves away. Which members a bond has is of no account.
+ * Whether a bond or a team has moved to another member: away, or back. One that no member carries is where it was
+ * last, so one that goes down on its primary and comes up on a backup has moved.
+ *
+ * A bond is back on the member that it names as its primary; one that names none only ever moves away. A team is back
+ * when it moves from a port of lower priority to one that no port outranks. Ports of equal priority are equals, as
+ * they are to teamd, which does not return to either: a team all of whose ports are equal only ever moves away.
  */
-class BondMoves {
+class CarrierMoves {
   public:
-    /** Takes the state of an interface and tells what it has done since the last one. */
-    std::optional<FailOver> take(const Link& link);
+    /** Takes what carries an interface now and tells what it has done since the last time. */
+    std::optional<FailOver> take(int index, const Carrier& carrier);
 
     void forget(int index) { _carriers.erase(index); }
 
   private:
-    std::map<int, int> _carriers; ///< by bond: the member that carried it last
+    std::map<int, Carrier> _carriers; ///< by interface: what carried it last
 };
 
 /**
@@ -48,7 +51,7 @@ class LinkEvents {
 
     HostTree& _tree;
     EventSink& _sink;
-    BondMoves _bonds;
+    CarrierMoves _moves;
 };
 
 } // namespace Orv::Agent::Linux

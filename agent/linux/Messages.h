@@ -1,13 +1,16 @@
 /**
  * @file
  * What the kernel says about interfaces, addresses, routes and neighbours, as plain values, and the one function that
- * reads them out of rtnetlink messages (rtnetlink(7), linux/if_link.h, linux/if_addr.h, linux/rtnetlink.h).
+ * reads them out of rtnetlink messages (rtnetlink(7), linux/if_link.h, linux/if_addr.h, linux/rtnetlink.h). What it
+ * says about teams comes another way (TeamMessages.h).
  */
 #pragma once
 
 #include "agent/linux/IpAddress.h"
 
 #include <cstdint>
+#include <map>
+#include <optional>
 #include <string>
 #include <variant>
 #include <vector>
@@ -76,6 +79,15 @@ struct Neighbour {
     bool operator==(const Neighbour&) const = default;
 };
 
+/** Options of a team that were set, came or went; those that are not in it stay as they are. */
+struct TeamOptions {
+    int index = 0;                                         ///< the team; positive
+    std::optional<int> activePort;                         ///< the port that carries it; 0: none does, or all do
+    std::map<int, std::optional<std::int32_t>> priorities; ///< of ports, by index; none: it is no port any more
+
+    bool operator==(const TeamOptions&) const = default;
+};
+
 /** An object that is there now, or one that is gone. */
 template <typename Object>
 struct Change {
@@ -89,7 +101,8 @@ struct Change {
  * One message; nothing when it is of another kind, malformed, or says nothing that counts here, as a route to
  * anywhere in particular.
  */
-using Message = std::variant<std::monostate, Change<Link>, Change<Address>, Change<Route>, Change<Neighbour>>;
+using Message =
+    std::variant<std::monostate, Change<Link>, Change<Address>, Change<Route>, Change<Neighbour>, TeamOptions>;
 
 /**
  * Reads one message of `message.nlmsg_len` bytes, all of which must be readable and aligned to four. Believes nothing

@@ -43,8 +43,8 @@ void NetlinkSocket::Close::operator()(mnl_socket* socket) const {
     mnl_socket_close(socket);
 }
 
-NetlinkSocket::NetlinkSocket(int receiveBytes)
-    : _socket(mnl_socket_open2(NETLINK_ROUTE, SOCK_CLOEXEC)), _buffer(initialBufferBytes / sizeof(std::uint32_t)) {
+NetlinkSocket::NetlinkSocket(int receiveBytes, int protocol)
+    : _socket(mnl_socket_open2(protocol, SOCK_CLOEXEC)), _buffer(initialBufferBytes / sizeof(std::uint32_t)) {
     if (!_socket || mnl_socket_bind(_socket.get(), 0, MNL_SOCKET_AUTOPID) < 0) {
         fail(errno, "opening a netlink socket");
     }
@@ -251,7 +251,7 @@ RequestSocket::Dump RequestSocket::exchange(nlmsghdr& request, const char* what,
     return answer.dump;
 }
 
-NotificationSocket::NotificationSocket(int receiveBytes) : _socket(receiveBytes) {}
+NotificationSocket::NotificationSocket(int receiveBytes, int protocol) : _socket(receiveBytes, protocol) {}
 
 void NotificationSocket::subscribe(int group) {
     _socket.setOption(SOL_NETLINK, NETLINK_ADD_MEMBERSHIP, group, "subscribing to kernel notifications");

@@ -15,8 +15,9 @@
 #include <string>
 #include <vector>
 
+#include <linux/netlink.h>
+
 struct mnl_socket;
-struct nlmsghdr;
 
 namespace Orv::Agent::Linux {
 
@@ -33,13 +34,16 @@ struct Verdict {
 Verdict verdictOf(const nlmsghdr& message);
 
 /**
- * A bound rtnetlink socket in the network namespace of the thread that made it, for good, whichever thread uses it
+ * A bound netlink socket in the network namespace of the thread that made it, for good, whichever thread uses it
  * later. Not thread-safe. Failures to set it up are thrown as std::system_error.
  */
 class NetlinkSocket {
   public:
-    /** `receiveBytes` is the size asked for the kernel's queue; without privileges the system's limit cuts it. */
-    explicit NetlinkSocket(int receiveBytes);
+    /**
+     * `receiveBytes` is the size asked for the kernel's queue; without privileges the system's limit cuts it.
+     * `protocol` is a NETLINK_*.
+     */
+    explicit NetlinkSocket(int receiveBytes, int protocol = NETLINK_ROUTE);
 
     [[nodiscard]] int descriptor() const;
 
@@ -105,9 +109,9 @@ class RequestSocket {
 class NotificationSocket {
   public:
     /** `receiveBytes` is the size of the queue; a smaller one overruns earlier. */
-    explicit NotificationSocket(int receiveBytes);
+    explicit NotificationSocket(int receiveBytes, int protocol = NETLINK_ROUTE);
 
-    /** Joins a group RTNLGRP_*. */
+    /** Joins a group of the protocol: RTNLGRP_*, or what a family of generic netlink has. */
     void subscribe(int group);
 
     /**

@@ -1,11 +1,14 @@
 /**
  * @file
- * Link messages that a kernel sent while something was done to it, as tests/vm/record wrote them down.
+ * Messages about links and teams that a kernel sent while something was done to it, as tests/vm/record wrote them
+ * down.
  */
 #pragma once
 
+#include "agent/linux/TeamMessages.h"
 #include "tests/linux/MessageBuilder.h"
 
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <fstream>
@@ -16,10 +19,26 @@
 
 namespace Orv::Test {
 
+/** One of rtnetlink, or of generic netlink. */
+struct RecordedMessage {
+    MessageBytes bytes;
+    bool isGeneric = false;
+
+    /** What follows the netlink header. */
+    [[nodiscard]] Agent::Hardware::Bytes payload() const {
+        const auto* begin = reinterpret_cast<const std::byte*>(&bytes.message());
+        return {begin + sizeof(nlmsghdr), bytes.length() - sizeof(nlmsghdr)};
+    }
+
+    [[nodiscard]] Agent::Linux::Message parse() const {
+        return isGeneric ? Agent::Linux::parseTeamMessage(payload()) : bytes.parse();
+    }
+};
+
 /** What the kernel said after one step; of the first, "dump", all links that there were. */
 struct RecordedStep {
     std::string command;
-    std::vector<MessageBytes> messages;
+    std::vector<RecordedMessage> messages;
 };
 
 inline Octets octetsOf(const std::string& digits) {
@@ -30,7 +49,10 @@ inline Octets octetsOf(const std::string& digits) {
     return octets;
 }
 
-inline MessageBytes recordedMessage(const std::string& digits) {
+inline RecordedMessage recordedMessage(const std::string& line) {
+    const std::string generic = "generic ";
+    const bool isGeneric = line.rfind(generic, 0) == 0;
+    const std::string digits = line.substr(isGeneric ? generic.size() : 0);
     const Octets octets = octetsOf(digits);
     nlmsghdr header{};
     if (octets.size() < sizeof header) {
@@ -40,7 +62,7 @@ inline MessageBytes recordedMessage(const std::string& digits) {
     if (header.nlmsg_len != octets.size()) {
         throw std::runtime_error("not the whole message: " + digits);
     }
-    return {header.nlmsg_type, Octets(octets.begin() + sizeof header, octets.end())};
+    return {MessageBytes(header.nlmsg_type, Octets(octets.begin() + sizeof header, octets.end())), isGeneric};
 }
 
 /** The steps of a recording, in order. Throws std::exception when there is none in the file. */

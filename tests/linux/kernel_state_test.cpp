@@ -48,6 +48,61 @@ TEST(KernelState, reportsEachLinkThatComesChangesAndGoes) {
     EXPECT_TRUE(state.links().empty());
 }
 
+Link team(int index) {
+    Link made = link(index, "team0");
+    made.kind = "team";
+    return made;
+}
+
+TEST(KernelState, keepsATeamsOptionsThatAreNotInAMessage) {
+    KernelState state = quietState({team(9)});
+    EXPECT_EQ(state.teams(), std::vector<int>{9});
+    EXPECT_EQ(state.carrierOf(team(9)), Carrier());
+    state.apply(TeamOptions{9, 2, {{2, std::int32_t{100}}, {3, std::int32_t{10}}}});
+    EXPECT_EQ(state.takeChanges(), std::set<int>{9});
+    EXPECT_EQ(state.carrierOf(team(9)), (Carrier{2, Carrier::Rank::first}));
+    state.apply(TeamOptions{9, 3, {}});
+    EXPECT_EQ(state.carrierOf(team(9)), (Carrier{3, Carrier::Rank::backup}));
+    state.apply(TeamOptions{9, std::nullopt, {{3, std::int32_t{100}}}});
+    EXPECT_EQ(state.carrierOf(team(9)), (Carrier{3, Carrier::Rank::first})) << "with an equal";
+    state.takeChanges();
+    state.apply(TeamOptions{9, 3, {{3, std::int32_t{100}}}});
+    EXPECT_FALSE(state.hasChanges());
+}
+
+TEST(KernelState, knowsNoCarrierOfATeamWhosePortIsLeaving) {
+    KernelState state = quietState({team(9)});
+    state.apply(TeamOptions{9, 2, {{2, std::int32_t{100}}, {3, std::int32_t{10}}}});
+    state.apply(TeamOptions{9, std::nullopt, {{2, std::nullopt}}});
+    EXPECT_EQ(state.carrierOf(team(9)), Carrier());
+    state.apply(TeamOptions{9, 3, {}});
+    EXPECT_EQ(state.carrierOf(team(9)), (Carrier{3, Carrier::Rank::first}));
+}
+
+TEST(KernelState, forgetsATeamWithItsLink) {
+    KernelState state = quietState({team(9)});
+    state.apply(TeamOptions{9, 2, {{2, std::int32_t{0}}}});
+    goes(state, team(9));
+    EXPECT_FALSE(state.hasTeams());
+    state.takeChanges();
+    state.apply(TeamOptions{9, 3, {{3, std::int32_t{0}}}});
+    EXPECT_FALSE(state.hasChanges()) << "its last words come late";
+    comes(state, team(9));
+    EXPECT_EQ(state.carrierOf(team(9)), Carrier());
+}
+
+TEST(KernelState, knowsWhatCarriesABond) {
+    const KernelState state;
+    Link bond = link(9, "bond0");
+    EXPECT_EQ(state.carrierOf(bond), Carrier());
+    bond.primaryMember = 2;
+    EXPECT_EQ(state.carrierOf(bond), Carrier());
+    bond.activeMember = 2;
+    EXPECT_EQ(state.carrierOf(bond), (Carrier{2, Carrier::Rank::named}));
+    bond.activeMember = 3;
+    EXPECT_EQ(state.carrierOf(bond), (Carrier{3, Carrier::Rank::backup}));
+}
+
 TEST(KernelState, reportsNothingWhenAMessageRepeatsWhatIsKnown) {
     KernelState state = quietState({link(2, "eth0")});
     const Address known = address(2, "10.0.0.1/24");

@@ -4,6 +4,7 @@
 #include "agent/linux/LinkEvents.h"
 #include "agent/linux/LinuxBackEnd.h"
 #include "tests/linux/Facts.h"
+#include "tests/linux/NoHardware.h"
 #include "tests/linux/TemporaryHost.h"
 #include "tests/linux/TreeReading.h"
 #include "tests/support/Namespace.h"
@@ -54,11 +55,6 @@ class Recorder : public EventSink {
     std::vector<Seen> seen;
     std::vector<Event> events;
 };
-
-HardwareSource noHardware() {
-    return {[](const DeviceName&) { return std::nullopt; }, [](const std::string&) { return std::nullopt; },
-            [](const std::string&) { return std::nullopt; }};
-}
 
 /** A state that a test changes link by link. */
 struct LinkEventsTest : testing::Test {
@@ -189,6 +185,84 @@ TEST_F(LinkEventsTest, forgetABondThatIsGone) {
     begin({bond(2, 2)});
     EXPECT_THAT(goes(9), ElementsAre(statusOfAdapter("bond0", 5)));
     EXPECT_THAT(comes(bond(3, 2)), ElementsAre(statusOfAdapter("bond0", 1)));
+}
+
+TEST_F(LinkEventsTest, tellOfABondThatMovesToAPrimaryThatIsAnotherByThen) {
+    begin({bond(2, 2)});
+    EXPECT_THAT(comes(bond(3, 3)), ElementsAre(statusOfAdapter("bond0", 33)));
+}
+
+/** A team of ports with these priorities, of which the first carries it. */
+struct TeamEventsTest : LinkEventsTest {
+    void beginWith(const std::map<int, int>& priorities) {
+        Link team = link(9, "team0");
+        team.kind = "team";
+        state.apply(Change<Link>{team, false});
+        TeamOptions options{9, priorities.begin()->first, {}};
+        for (const auto& [port, priority] : priorities) {
+            options.priorities[port] = priority;
+        }
+        state.apply(options);
+        begin({});
+    }
+
+    std::vector<Seen> moves(int port) { return after(TeamOptions{9, port, {}}); }
+
+    const Seen switchOver = statusOfAdapter("team0", 32);
+    const Seen switchBack = statusOfAdapter("team0", 33);
+};
+
+TEST_F(TeamEventsTest, tellOfATeamThatMovesOffItsPreferredPortAndBack) {
+    beginWith({{2, 100}, {3, 10}});
+    EXPECT_THAT(moves(3), ElementsAre(switchOver));
+    EXPECT_EQ(Agent::statusOf(*tree.adapter(9)), 1U) << "it works all the time";
+    EXPECT_THAT(moves(3), ElementsAre());
+    EXPECT_THAT(moves(2), ElementsAre(switchBack));
+}
+
+TEST_F(TeamEventsTest, tellOfEveryMoveToABackup) {
+    beginWith({{2, 100}, {3, 10}, {4, 0}});
+    EXPECT_THAT(moves(3), ElementsAre(switchOver));
+    EXPECT_THAT(moves(4), ElementsAre(switchOver));
+    EXPECT_THAT(moves(3), ElementsAre(switchOver)) << "better than the last, but not the best";
+    EXPECT_THAT(moves(2), ElementsAre(switchBack));
+}
+
+TEST_F(TeamEventsTest, knowNoWayBackAmongEqualPorts) {
+    beginWith({{2, 0}, {3, 0}});
+    EXPECT_THAT(moves(3), ElementsAre(switchOver));
+    EXPECT_THAT(moves(2), ElementsAre(switchOver));
+}
+
+TEST_F(TeamEventsTest, tellOfTheReturnToAnyOfTheBest) {
+    beginWith({{2, 100}, {3, 100}, {4, 10}});
+    EXPECT_THAT(moves(3), ElementsAre(switchOver));
+    EXPECT_THAT(moves(4), ElementsAre(switchOver));
+    EXPECT_THAT(moves(3), ElementsAre(switchBack));
+}
+
+TEST_F(TeamEventsTest, tellOfAMoveAwayFromAPortThatIsTakenAway) {
+    beginWith({{2, 0}, {3, 0}});
+    EXPECT_THAT(after(TeamOptions{9, 0, {{2, std::nullopt}}}), ElementsAre());
+    EXPECT_THAT(moves(3), ElementsAre(switchOver)) << "the port that is left was not preferred to the other";
+}
+
+TEST_F(TeamEventsTest, goByThePrioritiesAsTheyAreAtTheMove) {
+    beginWith({{2, 100}, {3, 10}});
+    EXPECT_THAT(after(TeamOptions{9, std::nullopt, {{3, 200}}}), ElementsAre());
+    EXPECT_THAT(moves(3), ElementsAre(switchBack));
+    EXPECT_THAT(moves(2), ElementsAre(switchOver));
+}
+
+TEST_F(TeamEventsTest, tellNothingOfTheFirstPortAndOfTeamsWithoutAnActiveOne) {
+    beginWith({{2, 100}, {3, 10}});
+    EXPECT_THAT(goes(9), ElementsAre(statusOfAdapter("team0", 5)));
+    Link team = link(9, "team0");
+    team.kind = "team";
+    EXPECT_THAT(comes(team), ElementsAre(statusOfAdapter("team0", 1)));
+    EXPECT_THAT(after(TeamOptions{9, 3, {{3, 10}, {2, 100}}}), ElementsAre());
+    EXPECT_THAT(moves(0), ElementsAre()) << "it has left the mode that has one";
+    EXPECT_THAT(moves(3), ElementsAre()) << "where it was last";
 }
 
 /** A back end in a namespace, watched without a thread: nothing is read until a test says so. */
