@@ -150,4 +150,53 @@ class BondTest : public testing::Test {
     }
 };
 
+/** team0, which teamd runs as activebackup, of eth0 and eth1; with both cables in when a test begins. */
+class TeamTest : public testing::Test {
+  protected:
+    void TearDown() override {
+        plugCable("eth0");
+        plugCable("eth1");
+        stopTeam();
+    }
+
+    /** With these priorities of its ports, as teamd has them: the greater number is preferred. */
+    static void startTeam(int priorityOfEth0, int priorityOfEth1) {
+        const auto port = [](int priority) { return "{\"prio\": " + std::to_string(priority) + "}"; };
+        shell("mkdir -p /var/run/teamd");
+        shell("teamd -d -t team0 -c '{\"runner\": {\"name\": \"activebackup\"}, \"link_watch\": {\"name\": "
+              "\"ethtool\"}, \"ports\": {\"eth0\": " +
+              port(priorityOfEth0) + ", \"eth1\": " + port(priorityOfEth1) + "}}' 2>/dev/null");
+        ip("link set team0 up");
+    }
+
+    static void stopTeam() {
+        if (!firstLine("/sys/class/net/team0/ifindex").empty()) {
+            shell("teamd -k -t team0 2>/dev/null");
+        }
+        ip("link set eth0 down");
+        ip("link set eth1 down");
+    }
+
+    /** Which port the driver says carries the team. */
+    static void expectCarrier(const std::string& port) {
+        const std::string index = firstLine("/sys/class/net/" + port + "/ifindex");
+        const auto carrier = [] {
+            shell("teamnl team0 getoption activeport >/tmp/activeport");
+            return firstLine("/tmp/activeport");
+        };
+        EXPECT_TRUE(isSoon([&] { return carrier() == index; })) << "carried by " << carrier();
+    }
+};
+
+/** eth0 is preferred. */
+class PreferringTeamTest : public TeamTest {
+  protected:
+    void SetUp() override {
+        startTeam(100, 10);
+        expectCarrier("eth0");
+        expectStatus("team0", 1);
+        expectStatus("eth1", 1);
+    }
+};
+
 } // namespace Orv::Test

@@ -1,4 +1,4 @@
-// Fail-over of a real bond, from the pulled plug to the indication that marlo prints.
+// Fail-over of a real bond and a real team, from the pulled plug to the indication that marlo prints.
 #include "tests/vm/Guest.h"
 
 #include <cstdio>
@@ -15,8 +15,7 @@ using testing::ElementsAre;
 /** marlo watch in the background. */
 class MarloWatch {
   public:
-    explicit MarloWatch(const std::string& arguments)
-        : _process(popen((MARLO_EXECUTABLE " watch " + arguments + " >" + _output).c_str(), "r")) {
+    explicit MarloWatch(const std::string& arguments) : _process(start(arguments)) {
         // A new adapter that is up is an indication, as soon as there is somebody watching.
         for (int probe = 0; probe < 30 && firstLine(_output).empty(); ++probe) {
             const std::string name = "probe" + std::to_string(probe);
@@ -65,6 +64,12 @@ class MarloWatch {
     }
 
   private:
+    /** What an earlier one has written must not be taken for its. */
+    [[nodiscard]] std::FILE* start(const std::string& arguments) const {
+        std::remove(_output.c_str());
+        return popen((MARLO_EXECUTABLE " watch " + arguments + " >" + _output).c_str(), "r");
+    }
+
     const std::string _output = "/tmp/watch.json";
     std::FILE* _process;
     std::vector<std::string> _probes;
@@ -80,6 +85,18 @@ TEST_F(BondTest, isIndicated) {
     EXPECT_THAT(watch.indications(),
                 ElementsAre("MARLO_NetworkAdapterOfflineEvent eth0", "MARLO_NetworkAdapterSwitchOverEvent bond0",
                             "MARLO_NetworkAdapterOnlineEvent eth0", "MARLO_NetworkAdapterSwitchBackEvent bond0"));
+}
+
+TEST_F(PreferringTeamTest, isIndicated) {
+    MarloWatch watch("--json --count 5 --timeout 120");
+    pullCable("eth0");
+    expectCarrier("eth1");
+    plugCable("eth0");
+    expectCarrier("eth0");
+    EXPECT_EQ(watch.wait(), 0);
+    EXPECT_THAT(watch.indications(),
+                ElementsAre("MARLO_NetworkAdapterOfflineEvent eth0", "MARLO_NetworkAdapterSwitchOverEvent team0",
+                            "MARLO_NetworkAdapterOnlineEvent eth0", "MARLO_NetworkAdapterSwitchBackEvent team0"));
 }
 
 } // namespace
