@@ -102,12 +102,6 @@ void appendLocation(std::string& out, const std::string& host, const std::string
     out += "</NAMESPACEPATH>";
 }
 
-void appendClassName(std::string& out, const std::string& name) {
-    out += "<CLASSNAME";
-    appendAttribute(out, "NAME", name);
-    out += "/>";
-}
-
 /** A path as far as it is given: a class where there are no keys. */
 void appendReference(std::string& out, const ObjectPath& path) {
     const bool isLocal = path.host.empty();
@@ -120,11 +114,13 @@ void appendReference(std::string& out, const ObjectPath& path) {
                    path.host);
     } else if (path.nameSpace.empty()) {
         appendClassName(out, path.className);
-    } else {
-        out += isLocal ? "<LOCALCLASSPATH>" : "<CLASSPATH>";
-        isLocal ? appendNameSpace(out, path.nameSpace) : appendLocation(out, path.host, path.nameSpace);
+    } else if (isLocal) {
+        out += "<LOCALCLASSPATH>";
+        appendNameSpace(out, path.nameSpace);
         appendClassName(out, path.className);
-        out += isLocal ? "</LOCALCLASSPATH>" : "</CLASSPATH>";
+        out += "</LOCALCLASSPATH>";
+    } else {
+        appendClassPath(out, path.host, path.nameSpace, path.className);
     }
     out += "</VALUE.REFERENCE>";
 }
@@ -151,9 +147,11 @@ void appendKey(std::string& out, const Value& value) {
     }
     const bool isBoolean = value.type == CMPI_boolean;
     const bool isNumber = (value.type & CMPI_ENC) == 0 && (value.type & (CMPI_INTEGER | CMPI_REAL)) != 0;
-    out += isBoolean  ? "<KEYVALUE VALUETYPE=\"boolean\">"
-           : isNumber ? "<KEYVALUE VALUETYPE=\"numeric\">"
-                      : "<KEYVALUE VALUETYPE=\"string\">";
+    out += isBoolean  ? "<KEYVALUE VALUETYPE=\"boolean\""
+           : isNumber ? "<KEYVALUE VALUETYPE=\"numeric\""
+                      : "<KEYVALUE VALUETYPE=\"string\"";
+    appendAttribute(out, "TYPE", typeAttribute(value.type));
+    out += '>';
     appendValueText(out, value);
     out += "</KEYVALUE>";
 }
@@ -198,6 +196,12 @@ void appendValue(std::string& out, const Value& value) {
     out += areReferences ? "</VALUE.REFARRAY>" : "</VALUE.ARRAY>";
 }
 
+void appendClassName(std::string& out, const std::string& name) {
+    out += "<CLASSNAME";
+    appendAttribute(out, "NAME", name);
+    out += "/>";
+}
+
 void appendPath(std::string& out, const ObjectPath& path, PathWrap wrap, const std::string& host) {
     switch (wrap) {
     case PathWrap::name:
@@ -225,10 +229,10 @@ void appendPath(std::string& out, const ObjectPath& path, PathWrap wrap, const s
 
 void appendClassPath(std::string& out, const std::string& host, const std::string& nameSpace,
                      const std::string& name) {
-    out += "<OBJECTPATH><CLASSPATH>";
+    out += "<CLASSPATH>";
     appendLocation(out, host, nameSpace);
     appendClassName(out, name);
-    out += "</CLASSPATH></OBJECTPATH>";
+    out += "</CLASSPATH>";
 }
 
 std::string typeAttribute(CMPIType type) {

@@ -20,7 +20,9 @@ void appendValueText(std::string& out, const Value& value);
 /** A path; `host` stands in those forms that have one. */
 void appendPath(std::string& out, const ObjectPath& path, PathWrap wrap, const std::string& host);
 
-/** CLASSPATH in OBJECTPATH. */
+void appendClassName(std::string& out, const std::string& name); ///< CLASSNAME
+
+/** CLASSPATH. */
 void appendClassPath(std::string& out, const std::string& host, const std::string& nameSpace,
                      const std::string& name);
 

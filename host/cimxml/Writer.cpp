@@ -180,19 +180,27 @@ void Writer::path(const ObjectPath& path, PathWrap wrap) {
 }
 
 void Writer::className(const std::string& name) {
-    _state->out += "<CLASSNAME";
-    appendAttribute(_state->out, "NAME", name);
-    _state->out += "/>";
+    appendClassName(_state->out, name);
     _state->passOn();
 }
 
 void Writer::classPath(const std::string& nameSpace, const std::string& name) {
+    _state->out += "<OBJECTPATH>";
     appendClassPath(_state->out, _state->host, nameSpace, name);
+    _state->out += "</OBJECTPATH>";
     _state->passOn();
 }
 
 void Writer::classDefinition(const Class& definition, const Form& form) {
     appendClass(_state->out, definition, form);
+    _state->passOn();
+}
+
+void Writer::classWithPath(const std::string& nameSpace, const Class& definition, const Form& form) {
+    _state->out += "<VALUE.OBJECTWITHPATH>";
+    appendClassPath(_state->out, _state->host, nameSpace, definition.name);
+    appendClass(_state->out, definition, form);
+    _state->out += "</VALUE.OBJECTWITHPATH>";
     _state->passOn();
 }
 
