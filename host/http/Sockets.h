@@ -1,0 +1,32 @@
+/**
+ * @file
+ * Sockets by address.
+ */
+#pragma once
+
+#include "host/http/Descriptor.h"
+#include "host/http/Message.h"
+#include "host/http/Server.h"
+
+#include <string>
+
+#include <sys/socket.h>
+
+namespace marlo::http {
+
+/** "127.0.0.1:5988", "[::1]:5989", "/run/marlo.sock". */
+std::string toString(const Endpoint& endpoint);
+
+/** A listening socket that does not block. Throws std::runtime_error that names the endpoint and the reason. */
+Descriptor listenOn(const Endpoint& endpoint);
+
+/** The port that a socket was given; 0 for a Unix domain socket. */
+unsigned short portOf(int descriptor);
+
+/** Who is at the other end of a connection that came in by `transport`. */
+Peer peerOf(int descriptor, const sockaddr_storage& address, Transport transport);
+
+/** Nothing waits for more to be sent with it: an answer that is given leaves at once. */
+void sendAtOnce(int descriptor);
+
+} // namespace marlo::http
