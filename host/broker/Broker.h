@@ -7,6 +7,7 @@
 #include "host/broker/Result.h"
 #include "host/broker/SchemaView.h"
 #include "host/broker/Scope.h"
+#include "host/model/AssociationFilter.h"
 #include "host/model/Instance.h"
 
 #include <functional>
@@ -31,7 +32,8 @@ struct Outcome {
 
 /**
  * What a provider may ask of others through the broker. Called on the provider's thread; results go to the sinks
- * before the function returns. All but the read operations are answered CMPI_RC_ERR_NOT_SUPPORTED by the broker.
+ * before the function returns. What is not overridden is answered CMPI_RC_ERR_NOT_SUPPORTED. Properties are got and
+ * set through getInstance and modifyInstance.
  */
 class UpCalls {
   public:
@@ -49,6 +51,22 @@ class UpCalls {
     virtual Outcome getInstance(const ObjectPath& path, const PropertyNames& properties,
                                 const InstanceSink& sink) = 0;
     virtual Outcome deliverIndication(const std::string& nameSpace, Instance&& indication) = 0;
+
+    virtual Outcome createInstance(const Instance& instance, ObjectPath& created);
+    /** Without a list, what `instance` has is changed. */
+    virtual Outcome modifyInstance(const Instance& instance, const PropertyNames& properties);
+    virtual Outcome deleteInstance(const ObjectPath& path);
+    virtual Outcome execQuery(const std::string& nameSpace, const std::string& query, const std::string& language,
+                              const InstanceSink& sink);
+    virtual Outcome invokeMethod(const ObjectPath& path, const std::string& method,
+                                 const std::vector<NamedValue>& arguments, Value& returned,
+                                 std::vector<NamedValue>& out);
+    virtual Outcome associators(const ObjectPath& path, const AssociationFilter& filter,
+                                const PropertyNames& properties, const InstanceSink& sink);
+    virtual Outcome associatorNames(const ObjectPath& path, const AssociationFilter& filter, const PathSink& sink);
+    virtual Outcome references(const ObjectPath& path, const AssociationFilter& filter,
+                               const PropertyNames& properties, const InstanceSink& sink);
+    virtual Outcome referenceNames(const ObjectPath& path, const AssociationFilter& filter, const PathSink& sink);
 
   protected:
     UpCalls() = default;

@@ -22,7 +22,8 @@ Status statusOf(const CMPIStatus& answered, const std::string& provider) {
     }
     std::string message = broker::messageOf(answered);
     if (message.empty()) {
-        message = "provider " + provider + " gave no reason";
+        message = "provider " + provider +
+                  (answered.rc == CMPI_RC_ERR_NOT_SUPPORTED ? " does not support this" : " gave no reason");
     }
     if (isCimStatus(answered.rc)) {
         return {answered.rc, std::move(message), {}};

@@ -1,5 +1,8 @@
 #include "host/cimom/ChangeChecks.h"
 
+#include "host/cimom/InstanceChecks.h"
+#include "host/cimom/References.h"
+
 #include <algorithm>
 
 namespace marlo {
@@ -10,11 +13,6 @@ bool isTrue(const Qualifiers& qualifiers, std::string_view name) {
     const Qualifier* found = findQualifier(qualifiers, name);
     const bool* truth = found == nullptr ? nullptr : std::get_if<bool>(&found->value.data);
     return truth != nullptr && *truth;
-}
-
-bool isAsked(const PropertyList& properties, const std::string& name) {
-    return std::any_of(properties->begin(), properties->end(),
-                       [&name](const std::string& asked) { return equalNames(asked, name); });
 }
 
 [[noreturn]] void refuse(const std::string& reason) {
@@ -35,6 +33,13 @@ Value requireType(const std::string& what, const Value& value, CMPIType type) {
         refuse(what + " is of type " + fullTypeName(type) + ", which " + toText(value) + " is not");
     }
     return *std::move(converted);
+}
+
+/** The value of a property as its class has it. */
+NamedValue requireValue(const Schema& schema, const std::string& nameSpace, const Class& definition,
+                        const Property& property, const Value& value) {
+    return {property.name, spellReferences(schema, nameSpace,
+                                           requireType(definition.name + "." + property.name, value, property.type))};
 }
 
 /** The names to be changed. */
@@ -67,12 +72,60 @@ std::vector<std::string> namesToChange(const Class& definition, const Instance& 
     return names;
 }
 
-void requireSameKey(const Class& definition, const Property& key, const NamedValue& given, const ObjectPath& path) {
+void requireSameKey(const Schema& schema, const Class& definition, const Property& key, const NamedValue& given,
+                    const ObjectPath& path) {
     const NamedValue* inPath = findName(path.keys, key.name);
-    const Value value = requireType(definition.name + "." + key.name, given.value, key.type);
-    if (inPath == nullptr || !(inPath->value == value)) {
+    if (inPath == nullptr ||
+        !(inPath->value == requireValue(schema, path.nameSpace, definition, key, given.value).value)) {
         refuse("the key " + key.name + " of an instance of " + definition.name + " cannot be changed");
     }
+}
+
+void requireInstantiable(const Class& definition) {
+    if (definition.isAbstract || definition.isIndication) {
+        throw RequestError(CMPI_RC_ERR_INVALID_CLASS,
+                           "there are no instances of " + definition.name + " itself, which is " +
+                               (definition.isAbstract ? "abstract" : "a class of indications"));
+    }
+}
+
+void requireOnce(const std::vector<NamedValue>& values, const NamedValue& value, const std::string& what) {
+    if (findName(values, value.name) != &value) {
+        refuse(what + " " + value.name + " is given twice");
+    }
+}
+
+/** The keys of a new instance that its path gives, checked against those that its properties give. */
+std::vector<NamedValue> requireKeysOf(const Schema& schema, const Class& definition, const std::string& nameSpace,
+                                      const Instance& instance, const std::vector<NamedValue>& properties) {
+    std::vector<NamedValue> keys;
+    for (const NamedValue& given : instance.path.keys) {
+        const Property* key = definition.findProperty(given.name);
+        if (key == nullptr || !key->key) {
+            refuse(definition.name + " has no key '" + given.name + "'");
+        }
+        requireOnce(instance.path.keys, given, "the key");
+        keys.push_back(requireValue(schema, nameSpace, definition, *key, given.value));
+        const NamedValue* property = findName(properties, key->name);
+        if (property != nullptr && !property->value.isNull() && !(property->value == keys.back().value)) {
+            refuse("the key " + key->name + " is another in the path than among the properties");
+        }
+    }
+    return keys;
+}
+
+/** What a new instance has of a property: what was given, else the default; nothing where there is neither. */
+std::optional<Value> initialValue(const Property& property, const std::vector<NamedValue>& given,
+                                  const std::vector<NamedValue>& keys) {
+    const NamedValue* value = findName(given, property.name);
+    if (value == nullptr || value->value.isNull()) {
+        const NamedValue* inPath = findName(keys, property.name);
+        value = inPath == nullptr ? value : inPath;
+    }
+    if (value != nullptr) {
+        return value->value;
+    }
+    return property.defaultValue.isNull() ? std::nullopt : std::optional(property.defaultValue);
 }
 
 } // namespace
@@ -104,25 +157,48 @@ std::optional<Value> convertValue(const Value& value, CMPIType type) {
     return Value{type, std::move(elements)};
 }
 
-Modification requireModification(const Class& definition, const Instance& modified, const PropertyList& properties) {
+Modification requireModification(const Schema& schema, const Class& definition, const Instance& modified,
+                                 const PropertyList& properties) {
+    const std::string& nameSpace = modified.path.nameSpace;
     Modification modification;
     modification.instance.path = modified.path;
     modification.names = namesToChange(definition, modified, properties);
     for (const NamedValue& given : modified.properties) {
         const Property& property = requireProperty(definition, given.name);
         if (property.key) {
-            requireSameKey(definition, property, given, modified.path);
+            requireSameKey(schema, definition, property, given, modified.path);
         }
     }
     for (const Property& property : definition.properties) {
         const NamedValue* given = findName(property.key ? modified.path.keys : modified.properties, property.name);
         const bool isChanged = property.key || isAsked(modification.names, property.name);
         modification.instance.properties.push_back(
-            {property.name, given != nullptr && isChanged
-                                ? requireType(definition.name + "." + property.name, given->value, property.type)
-                                : Value::null(property.type)});
+            given != nullptr && isChanged ? requireValue(schema, nameSpace, definition, property, given->value)
+                                          : NamedValue{property.name, Value::null(property.type)});
     }
     return modification;
+}
+
+Instance requireCreation(const Schema& schema, const Class& definition, const std::string& nameSpace,
+                         const Instance& instance) {
+    requireInstantiable(definition);
+    std::vector<NamedValue> given;
+    for (const NamedValue& value : instance.properties) {
+        const Property& property = requireProperty(definition, value.name);
+        requireOnce(instance.properties, value, "the property");
+        given.push_back(requireValue(schema, nameSpace, definition, property, value.value));
+    }
+    const auto keys = requireKeysOf(schema, definition, nameSpace, instance, given);
+    Instance created{{"", nameSpace, definition.name, {}}, {}};
+    for (const Property& property : definition.properties) {
+        if (auto value = initialValue(property, given, keys)) {
+            if (property.key && !value->isNull()) {
+                created.path.keys.push_back({property.name, *value});
+            }
+            created.properties.push_back({property.name, *std::move(value)});
+        }
+    }
+    return created;
 }
 
 const Method& requireMethod(const Class& definition, const std::string& name) {
@@ -133,14 +209,16 @@ const Method& requireMethod(const Class& definition, const std::string& name) {
     return *method;
 }
 
-ObjectPath requireMethodPath(const Class& definition, const Method& method, const ObjectPath& path) {
+ObjectPath requireMethodPath(const Schema& schema, const Class& definition, const Method& method,
+                             const ObjectPath& path) {
     if (path.keys.empty() && isTrue(method.qualifiers, "Static")) {
         return {"", path.nameSpace, definition.name, {}};
     }
-    return requireKeys(definition, path.nameSpace, path);
+    return requireKeys(schema, definition, path.nameSpace, path);
 }
 
-std::vector<NamedValue> requireArguments(const Method& method, const std::vector<NamedValue>& arguments) {
+std::vector<NamedValue> requireArguments(const Schema& schema, const std::string& nameSpace, const Method& method,
+                                         const std::vector<NamedValue>& arguments) {
     for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
         const bool isTaken =
             std::any_of(method.parameters.begin(), method.parameters.end(), [&](const Parameter& parameter) {
@@ -156,8 +234,10 @@ std::vector<NamedValue> requireArguments(const Method& method, const std::vector
     std::vector<NamedValue> checked;
     for (const Parameter& parameter : method.parameters) {
         if (const NamedValue* given = findName(arguments, parameter.name); given != nullptr) {
-            checked.push_back({parameter.name, requireType("the parameter " + parameter.name + " of " + method.name,
-                                                           given->value, parameter.type)});
+            checked.push_back(
+                {parameter.name, spellReferences(schema, nameSpace,
+                                                 requireType("the parameter " + parameter.name + " of " + method.name,
+                                                             given->value, parameter.type))});
         }
     }
     return checked;

@@ -23,7 +23,17 @@ struct Modification {
  * RequestError for names that the class does not have or that cannot be written, for values of another type and for
  * a key that is not the path's.
  */
-Modification requireModification(const Class& definition, const Instance& modified, const PropertyList& properties);
+Modification requireModification(const Schema& schema, const Class& definition, const Instance& modified,
+                                 const PropertyList& properties);
+
+/**
+ * What a provider's createInstance is called with: the path with those keys that properties or path give, the
+ * properties that are given and those that have a default. Throws RequestError for a class that cannot have instances
+ * of its own, for names that the class does not have or that are given twice, for values of another type and for keys
+ * of the path that are others than those of the properties.
+ */
+Instance requireCreation(const Schema& schema, const Class& definition, const std::string& nameSpace,
+                         const Instance& instance);
 
 /** The method of that name. Throws RequestError for an unknown one. */
 const Method& requireMethod(const Class& definition, const std::string& name);
@@ -32,13 +42,15 @@ const Method& requireMethod(const Class& definition, const std::string& name);
  * The path that a method is called on: all keys, as requireKeys has it, or, for a method that belongs to the class
  * (qualifier Static), none. Throws RequestError.
  */
-ObjectPath requireMethodPath(const Class& definition, const Method& method, const ObjectPath& path);
+ObjectPath requireMethodPath(const Schema& schema, const Class& definition, const Method& method,
+                             const ObjectPath& path);
 
 /**
  * The arguments as the schema spells and types them, in its order. Throws RequestError for one that the method does
  * not take, that is given twice, or that is of another type. A parameter that is not given is left out.
  */
-std::vector<NamedValue> requireArguments(const Method& method, const std::vector<NamedValue>& arguments);
+std::vector<NamedValue> requireArguments(const Schema& schema, const std::string& nameSpace, const Method& method,
+                                         const std::vector<NamedValue>& arguments);
 
 /** A value as one of another type, an array element by element, NULL as NULL; nothing when it cannot be that. */
 std::optional<Value> convertValue(const Value& value, CMPIType type);

@@ -1,5 +1,6 @@
 #include "host/cimom/ClassChecks.h"
 
+#include "host/cimom/References.h"
 #include "host/model/DateTimeText.h"
 
 #include <algorithm>
@@ -164,7 +165,8 @@ std::optional<Value> convertKey(const Value& value, CMPIType type) {
     return std::nullopt;
 }
 
-ObjectPath requireKeys(const Class& definition, const std::string& nameSpace, const ObjectPath& path) {
+ObjectPath requireKeys(const Schema& schema, const Class& definition, const std::string& nameSpace,
+                       const ObjectPath& path) {
     ObjectPath checked{"", nameSpace, definition.name, {}};
     const auto keys = definition.keys();
     for (const NamedValue& given : path.keys) {
@@ -174,7 +176,7 @@ ObjectPath requireKeys(const Class& definition, const std::string& nameSpace, co
         }
     }
     for (const Property* key : keys) {
-        checked.keys.push_back({key->name, requireKey(definition, *key, path)});
+        checked.keys.push_back({key->name, spellReferences(schema, nameSpace, requireKey(definition, *key, path))});
     }
     return checked;
 }

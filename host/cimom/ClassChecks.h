@@ -37,10 +37,11 @@ void requireProperties(const Schema& schema, const std::string& nameSpace, const
 PropertyList namesToAsk(const Class& definition, const PropertyList& properties);
 
 /**
- * The path of an instance of the class, spelled and typed as the schema has it, the keys in its order. Throws
- * RequestError for a key that is missing, unknown or of another type.
+ * The path of an instance of the class, spelled and typed as the schema has it, the keys in its order, references
+ * among them as spellReferences has them. Throws RequestError for a key that is missing, unknown or of another type.
  */
-ObjectPath requireKeys(const Class& definition, const std::string& nameSpace, const ObjectPath& path);
+ObjectPath requireKeys(const Schema& schema, const Class& definition, const std::string& nameSpace,
+                       const ObjectPath& path);
 
 /**
  * A value as one of another type: integers where their number fits, texts as date-times and paths where they are

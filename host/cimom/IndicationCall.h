@@ -6,6 +6,7 @@
 
 #include "host/broker/Broker.h"
 #include "host/cimom/ObjectManager.h"
+#include "host/cimom/Principal.h"
 #include "host/cimom/Provider.h"
 
 #include <functional>
@@ -13,19 +14,20 @@
 namespace marlo {
 
 /**
- * Each function calls the one of the interface (CMPI 2.0, indication MI) in a scope of its own. A failure's message
- * begins with the function, the provider and the class; what a provider throws is one.
+ * Each function calls the one of the interface (CMPI 2.0, indication MI) in a scope of its own, in the name of the
+ * user that acts when this is made. A failure's message begins with the function, the provider and the class; what a
+ * provider throws is one. A provider whose table has no authorizeFilter, mustPoll, enableIndications or
+ * disableIndications has no objection.
  */
 class IndicationCall {
   public:
     /** `filter` is what the provider is given as such; `fromClass` the class that the filter names, in the schema's
      * spelling, `className` the one of this provider that is concerned. All outlive this. */
-    IndicationCall(const broker::Broker& broker, Provider& provider, const std::string& principal,
-                   const CMPISelectExp* filter, const std::string& nameSpace, const std::string& fromClass,
-                   const std::string& className)
+    IndicationCall(const broker::Broker& broker, Provider& provider, const CMPISelectExp* filter,
+                   const std::string& nameSpace, const std::string& fromClass, const std::string& className)
         : _broker(broker),
           _provider(provider),
-          _principal(principal),
+          _principal(actingPrincipal()),
           _filter(filter),
           _nameSpace(nameSpace),
           _fromClass(fromClass),
@@ -55,7 +57,7 @@ class IndicationCall {
 
     const broker::Broker& _broker;
     Provider& _provider;
-    const std::string& _principal;
+    const std::string _principal;
     const CMPISelectExp* _filter;
     const std::string& _nameSpace;
     const std::string& _fromClass;

@@ -1,17 +1,13 @@
 #include "host/cimom/InstanceChecks.h"
 
 #include "host/cimom/ChangeChecks.h"
+#include "host/cimom/References.h"
 
 #include <algorithm>
 
 namespace marlo {
 
 namespace {
-
-bool isAsked(const PropertyList& properties, const std::string& name) {
-    return !properties || std::any_of(properties->begin(), properties->end(),
-                                      [&name](const std::string& asked) { return equalNames(asked, name); });
-}
 
 /** Embedded instances are texts to the schema; what qualifies a text as such a one is not checked. */
 bool isOfType(const Value& value, CMPIType type) {
@@ -21,6 +17,11 @@ bool isOfType(const Value& value, CMPIType type) {
 }
 
 } // namespace
+
+bool isAsked(const PropertyList& properties, const std::string& name) {
+    return !properties || std::any_of(properties->begin(), properties->end(),
+                                      [&name](const std::string& asked) { return equalNames(asked, name); });
+}
 
 void OnceLog::say(const std::string& text) {
     {
@@ -55,7 +56,7 @@ std::optional<ObjectPath> InstanceChecks::checkPath(const ObjectPath& path) {
         return std::nullopt;
     }
     try {
-        return requireKeys(*definition, _nameSpace, path);
+        return requireKeys(_schema, *definition, _nameSpace, path);
     } catch (const RequestError& error) {
         say("left out an answer: " + std::string(error.what()));
         return std::nullopt;
@@ -75,6 +76,8 @@ bool InstanceChecks::checkProperty(const Class& definition, NamedValue& property
         say("left out the value of " + definition.name + "." + known->name + ", which is of type " +
             fullTypeName(property.value.type) + " and not " + fullTypeName(known->type));
         return false;
+    } else if ((known->type & ~CMPI_ARRAY) == CMPI_ref) {
+        property.value = spellReferences(_schema, _nameSpace, property.value);
     }
     property.name = known->name;
     return true;

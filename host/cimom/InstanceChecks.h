@@ -14,6 +14,9 @@
 
 namespace marlo {
 
+/** True when a property list has the name, or is none. */
+bool isAsked(const PropertyList& properties, const std::string& name);
+
 /** Says each thing once, however often it is found. Any thread. */
 class OnceLog {
   public:

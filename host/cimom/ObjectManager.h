@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "host/model/AssociationFilter.h"
 #include "host/model/Instance.h"
 #include "host/schema/Schema.h"
 
@@ -38,29 +39,24 @@ struct MethodAnswer {
     std::vector<NamedValue> out;
 };
 
-/** Which associations to follow; an empty name stands for any. */
-struct AssociationFilter {
-    std::string associationClass;
-    std::string resultClass; ///< of what is at the other end; of `references`: unused
-    std::string role;        ///< the reference of the association that points at the start
-    std::string resultRole;  ///< the reference that points at the other end
-};
-
 /** Tells a subscription from every other one of its object manager; 0 is none. */
 using SubscriptionId = std::uint64_t;
 
 struct ObjectManagerOptions {
-    std::string schemaDirectory;   ///< *.mof
-    std::string providerDirectory; ///< *.toml, a registration file per provider library
-    std::string libraryDirectory;  ///< where registered libraries with a relative name lie
+    std::vector<std::string> schemaDirectories;   ///< *.mof, read one directory after the other
+    std::vector<std::string> providerDirectories; ///< *.toml, a registration file per provider library
+    /** Where registered libraries with a relative name lie, unless they lie beside their registration file. */
+    std::string libraryDirectory;
 
     /** Receives what providers log and what is wrong with their answers, from any thread; none: standard error. */
     std::function<void(const std::string& line)> log;
     bool trace = false; ///< the log receives what providers trace as well
 };
 
-/** In whose name this thread asks for operations, as CMPIPrincipal tells providers; else the user that the process
- * works for. */
+/**
+ * In whose name this thread asks for operations, as CMPIPrincipal tells providers; else the user that the process
+ * works for. Within each other the innermost counts.
+ */
 class ActingFor {
   public:
     explicit ActingFor(std::string principal);
@@ -99,6 +95,9 @@ class ObjectManager {
      *
      * All operations: a sink may throw, which ends the operation with what it threw. Unknown namespaces, classes and
      * property names, wrong keys and classes that no provider serves are refused without asking a provider.
+     * Namespaces are taken as spellNameSpace has it. References come with the namespace and without a host, whatever
+     * a provider put there. Texts are what the provider gave, byte by byte: whoever writes them out replaces what is
+     * no UTF-8, so that a key that was read finds its instance again.
      */
     Status enumerateInstances(const std::string& nameSpace, const std::string& className,
                               const PropertyList& properties, const InstanceSink& sink);
@@ -126,8 +125,9 @@ class ObjectManager {
                         MethodAnswer& answer);
 
     /**
-     * Makes an instance of a class, with the keys that the instance's properties or path have; `created` is its path,
-     * complete, with namespace and without host. A property that has a default and is not given gets it.
+     * Makes an instance of a class, with the keys that the instance's properties or path have; keys that are missing
+     * are the provider's to find. `created` is its path, complete, with namespace and without host. A property that
+     * has a default and is not given gets it.
      */
     Status createInstance(const Instance& instance, ObjectPath& created);
 
@@ -136,15 +136,18 @@ class ObjectManager {
 
     /**
      * Those of what enumerateInstances gives for the class of a SELECT statement ("WQL", "CQL", "CIM:CQL",
-     * "DMTF:CQL") that its condition holds for, each with the selected properties and a complete path.
+     * "DMTF:CQL") that its condition holds for, each with the selected properties and a complete path. Providers' own
+     * execQuery is not asked: each understands another part of some language, and none asks for subclasses.
      */
     Status execQuery(const std::string& nameSpace, const std::string& query, const std::string& language,
                      const InstanceSink& sink);
 
     /**
      * What is associated with the instance at a path: the instances at the other ends, their paths, the associations
-     * themselves, their paths. Found among the instances of all association classes that somebody serves; nothing
-     * where there are none. A class or a role that does not exist is refused.
+     * themselves, their paths; each once. Found among the instances of all association classes that somebody serves;
+     * nothing where there are none. The start needs all its keys, but need not exist. What is at another end but
+     * cannot be had is left out. A class or a role that does not exist is refused (CMPI_RC_ERR_INVALID_PARAMETER);
+     * property names that a class lacks are overlooked, as what is found may be of many classes.
      */
     Status associators(const ObjectPath& path, const AssociationFilter& filter, const PropertyList& properties,
                        const InstanceSink& sink);
@@ -153,8 +156,10 @@ class ObjectManager {
                       const InstanceSink& sink);
     Status referenceNames(const ObjectPath& path, const AssociationFilter& filter, const PathSink& sink);
 
-    /** Has the object manager serve classes by itself. Before the first request; throws std::runtime_error for a
-     * class that the schema lacks or that a provider serves. */
+    /**
+     * Has the object manager serve classes by itself. Before the first request; throws std::runtime_error for a class
+     * that the schema lacks or that somebody serves. The classes of Interop.h are served from the beginning.
+     */
     void add(std::shared_ptr<BuiltIn> builtIn);
 
     /** Receives an indication on the thread that delivers it; several at once when several deliver. */
@@ -180,6 +185,9 @@ class ObjectManager {
     Status unsubscribe(SubscriptionId id);
 
     [[nodiscard]] const Schema& schema() const;
+
+    /** A namespace as the schema spells it, for what is asked of the schema itself (spellNameSpace). */
+    [[nodiscard]] std::string spell(const std::string& nameSpace) const;
 
   private:
     struct State;

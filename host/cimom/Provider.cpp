@@ -31,12 +31,33 @@ void tellEnd(MI*& mi, const CMPIContext& context) {
         return;
     }
     try {
-        mi->ft->cleanup(mi, &context, 1);
+        if (mi->ft->cleanup != nullptr) {
+            mi->ft->cleanup(mi, &context, 1);
+        }
     } catch (...) {
         // Nobody is left to whom a failed cleanup would matter.
         static_cast<void>(currentExceptionText());
     }
     mi = nullptr;
+}
+
+/**
+ * Function tables have grown at their end only, so that one of a later version than this object manager's can be
+ * used; before 1.0 they were others, and what has no version at all is no table.
+ */
+constexpr CMPIVersion oldestTable = 100;
+
+template <typename MI>
+MI& requireTable(MI* mi, const std::string& where) {
+    if (mi->ft == nullptr) {
+        throw LoadError(where + " made an interface without a function table");
+    }
+    if (mi->ft->ftVersion < oldestTable) {
+        throw LoadError(where + " made an interface whose function table is of version " +
+                        std::to_string(mi->ft->ftVersion) + ", and not of " + std::to_string(oldestTable) +
+                        " or later");
+    }
+    return *mi;
 }
 
 } // namespace
@@ -85,7 +106,9 @@ void* Provider::symbol(const std::string& name) {
 }
 
 /** All factories have this type but for what they return, which is a pointer for all of them. */
-void* Provider::make(const std::string& factory, const CMPIContext& context) {
+template <typename MI>
+MI& Provider::make(const std::string& kind, const CMPIContext& context) {
+    const std::string factory = _registration.name + "_Create_" + kind;
     using Factory = void* (*)(const CMPIBroker*, const CMPIContext*, CMPIStatus*);
     const auto function = reinterpret_cast<Factory>(symbol(factory));
     const std::string where =
@@ -101,13 +124,13 @@ void* Provider::make(const std::string& factory, const CMPIContext& context) {
         const std::string reason = broker::messageOf(status);
         throw LoadError(where + " made nothing" + (reason.empty() ? "" : ": " + reason));
     }
-    return made;
+    return requireTable(static_cast<MI*>(made), where);
 }
 
 CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
     if (_instanceMI == nullptr) {
-        _instanceMI = static_cast<CMPIInstanceMI*>(make(_registration.name + "_Create_InstanceMI", context));
+        _instanceMI = &make<CMPIInstanceMI>("InstanceMI", context);
     }
     return *_instanceMI;
 }
@@ -115,7 +138,7 @@ CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
 CMPIMethodMI& Provider::methodMI(const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
     if (_methodMI == nullptr) {
-        _methodMI = static_cast<CMPIMethodMI*>(make(_registration.name + "_Create_MethodMI", context));
+        _methodMI = &make<CMPIMethodMI>("MethodMI", context);
     }
     return *_methodMI;
 }
@@ -123,7 +146,7 @@ CMPIMethodMI& Provider::methodMI(const CMPIContext& context) {
 CMPIIndicationMI& Provider::indicationMI(const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
     if (_indicationMI == nullptr) {
-        _indicationMI = static_cast<CMPIIndicationMI*>(make(_registration.name + "_Create_IndicationMI", context));
+        _indicationMI = &make<CMPIIndicationMI>("IndicationMI", context);
     }
     return *_indicationMI;
 }

@@ -35,7 +35,7 @@ class Provider {
 
     [[nodiscard]] bool serves(ProviderKind kind, std::string_view nameSpace, std::string_view className) const;
 
-    /** The instance interface, made by its factory the first time. Throws LoadError. */
+    /** The instance interface, made by its factory the first time, with a function table. Throws LoadError. */
     CMPIInstanceMI& instanceMI(const CMPIContext& context);
     /** The method interface; the same. */
     CMPIMethodMI& methodMI(const CMPIContext& context);
@@ -51,7 +51,8 @@ class Provider {
 
   private:
     void* symbol(const std::string& name);
-    void* make(const std::string& factory, const CMPIContext& context);
+    template <typename MI>
+    MI& make(const std::string& kind, const CMPIContext& context);
 
     Registration _registration;
     const CMPIBroker* _broker;

@@ -90,8 +90,8 @@ Status ProviderCall::enumerateInstances(const ObjectPath& classPath, const Prope
     Collector collector(sink);
     return collector.statusOf(call(classPath, properties, collector, [this](const Arguments& arguments) {
         CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
-        return mi.ft->enumerateInstances(&mi, arguments.context, arguments.result, arguments.path,
-                                         arguments.properties);
+        return callSlot(mi.ft->enumerateInstances, mi, arguments.context, arguments.result, arguments.path,
+                        arguments.properties);
     }));
 }
 
@@ -99,7 +99,7 @@ Status ProviderCall::enumerateInstanceNames(const ObjectPath& classPath, const P
     Collector collector(sink);
     return collector.statusOf(call(classPath, std::nullopt, collector, [this](const Arguments& arguments) {
         CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
-        return mi.ft->enumerateInstanceNames(&mi, arguments.context, arguments.result, arguments.path);
+        return callSlot(mi.ft->enumerateInstanceNames, mi, arguments.context, arguments.result, arguments.path);
     }));
 }
 
@@ -107,7 +107,26 @@ Status ProviderCall::getInstance(const ObjectPath& path, const PropertyList& pro
     Collector collector(sink);
     return collector.statusOf(call(path, properties, collector, [this](const Arguments& arguments) {
         CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
-        return mi.ft->getInstance(&mi, arguments.context, arguments.result, arguments.path, arguments.properties);
+        return callSlot(mi.ft->getInstance, mi, arguments.context, arguments.result, arguments.path,
+                        arguments.properties);
+    }));
+}
+
+Status ProviderCall::createInstance(const Instance& instance, ObjectPath& created) {
+    const PathSink sink = [&created](ObjectPath&& path) { created = std::move(path); };
+    Collector collector(sink);
+    return collector.statusOf(call(instance.path, std::nullopt, collector, [&](const Arguments& arguments) {
+        CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
+        return callSlot(mi.ft->createInstance, mi, arguments.context, arguments.result, arguments.path,
+                        _broker.newInstance(instance));
+    }));
+}
+
+Status ProviderCall::deleteInstance(const ObjectPath& path) {
+    Collector collector;
+    return collector.statusOf(call(path, std::nullopt, collector, [this](const Arguments& arguments) {
+        CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
+        return callSlot(mi.ft->deleteInstance, mi, arguments.context, arguments.result, arguments.path);
     }));
 }
 
@@ -118,8 +137,8 @@ Status ProviderCall::modifyInstance(const Instance& instance, const std::vector<
         instance.path, names, collector,
         [&](const Arguments& arguments) {
             CMPIInstanceMI& mi = _provider.instanceMI(*arguments.context);
-            return mi.ft->modifyInstance(&mi, arguments.context, arguments.result, arguments.path,
-                                         _broker.newInstance(instance), arguments.properties);
+            return callSlot(mi.ft->modifyInstance, mi, arguments.context, arguments.result, arguments.path,
+                            _broker.newInstance(instance), arguments.properties);
         },
         &isDone));
     return status.ok() && !isDone ? Status{CMPI_RC_ERR_FAILED, "", {}} : status;
@@ -134,8 +153,8 @@ Status ProviderCall::invokeMethod(const ObjectPath& path, const std::string& met
         [&](const Arguments& prepared) {
             CMPIMethodMI& mi = _provider.methodMI(*prepared.context);
             CMPIArgs* out = _broker.newArgs({});
-            const CMPIStatus answered = mi.ft->invokeMethod(&mi, prepared.context, prepared.result, prepared.path,
-                                                            method.c_str(), _broker.newArgs(arguments), out);
+            const CMPIStatus answered = callSlot(mi.ft->invokeMethod, mi, prepared.context, prepared.result,
+                                                 prepared.path, method.c_str(), _broker.newArgs(arguments), out);
             answer.out = broker::Broker::toModel(*out);
             return answered;
         },

@@ -17,7 +17,8 @@ namespace marlo {
  * Calls a provider with all that CMPI prepares for it and releases what the call created when it is over.
  *
  * Answers go to the sinks as they come. What the provider throws becomes CMPI_RC_ERR_FAILED with its text; what a
- * sink throws is thrown on once the provider has returned.
+ * sink throws is thrown on once the provider has returned. A function that the provider's table leaves out is
+ * answered CMPI_RC_ERR_NOT_SUPPORTED.
  */
 class ProviderCall {
   public:
@@ -30,6 +31,10 @@ class ProviderCall {
     Status enumerateInstances(const ObjectPath& classPath, const PropertyList& properties, const InstanceSink& sink);
     Status enumerateInstanceNames(const ObjectPath& classPath, const PathSink& sink);
     Status getInstance(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
+
+    /** `created` is the path that the provider returned, and is left alone where it returned none. */
+    Status createInstance(const Instance& instance, ObjectPath& created);
+    Status deleteInstance(const ObjectPath& path);
 
     /**
      * A provider that ends either of these in success, but has not said that it is done, has failed: the status is

@@ -54,12 +54,21 @@ class FileReader {
         std::vector<Registration> registrations;
         for (toml::table* table : tables) {
             registrations.push_back(readProvider(*table));
-            registrations.back().library = (std::filesystem::path(_libraryDirectory) / library).string();
+            registrations.back().library = findLibrary(library);
         }
         return registrations;
     }
 
   private:
+    /** With its directory; an absolute path stays what it is. */
+    [[nodiscard]] std::string findLibrary(const std::string& library) const {
+        const std::filesystem::path beside = std::filesystem::path(_file).parent_path() / library;
+        std::error_code ignored;
+        return (std::filesystem::exists(beside, ignored) ? beside
+                                                         : std::filesystem::path(_libraryDirectory) / library)
+            .string();
+    }
+
     static std::string requireText(TomlReader& reader, std::string_view key) {
         const auto text = reader.text(key);
         if (!text || text->empty()) {
@@ -184,15 +193,17 @@ std::vector<std::string> filesOf(const std::string& directory) {
 
 } // namespace
 
-std::vector<Registration> readRegistrations(const std::string& directory, const std::string& libraryDirectory,
-                                            const Schema& schema) {
+std::vector<Registration> readRegistrations(const std::vector<std::string>& directories,
+                                            const std::string& libraryDirectory, const Schema& schema) {
     std::vector<Registration> registrations;
-    for (const std::string& file : filesOf(directory)) {
-        for (Registration& registration : FileReader(file, libraryDirectory, schema).read()) {
-            for (const Registration& earlier : registrations) {
-                refuseConflict(earlier, registration);
+    for (const std::string& directory : directories) {
+        for (const std::string& file : filesOf(directory)) {
+            for (Registration& registration : FileReader(file, libraryDirectory, schema).read()) {
+                for (const Registration& earlier : registrations) {
+                    refuseConflict(earlier, registration);
+                }
+                registrations.push_back(std::move(registration));
             }
-            registrations.push_back(std::move(registration));
         }
     }
     return registrations;

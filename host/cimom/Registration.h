@@ -26,11 +26,12 @@ struct Registration {
 };
 
 /**
- * Reads the `*.toml` files of a directory in the order of their names. A relative library lies in `libraryDirectory`.
- * Throws std::runtime_error "FILE:LINE: KEY: REASON" for what is wrong, and for a class of which two providers serve
- * the same kind in the same namespace.
+ * Reads the `*.toml` files of directories, one directory after the other, in each in the order of their names. A
+ * relative library lies beside the file that names it or else in `libraryDirectory`. Throws std::runtime_error
+ * "FILE:LINE: KEY: REASON" for what is wrong, and for a class of which two providers serve the same kind in the same
+ * namespace.
  */
-std::vector<Registration> readRegistrations(const std::string& directory, const std::string& libraryDirectory,
-                                            const Schema& schema);
+std::vector<Registration> readRegistrations(const std::vector<std::string>& directories,
+                                            const std::string& libraryDirectory, const Schema& schema);
 
 } // namespace marlo

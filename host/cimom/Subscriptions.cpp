@@ -2,6 +2,8 @@
 
 #include "host/cimom/ClassChecks.h"
 #include "host/cimom/IndicationCall.h"
+#include "host/cimom/QueryText.h"
+#include "host/cimom/References.h"
 
 #include <algorithm>
 #include <utility>
@@ -13,16 +15,6 @@ namespace {
 /** The class of a filter or of an indication is one, or there is a reason why not. */
 std::string indicationFault(const Class& definition) {
     return definition.isIndication ? "" : definition.name + " is not a class of indications";
-}
-
-/** The namespace as the schema spells it. */
-std::string spellingOf(const Schema& schema, const std::string& nameSpace) {
-    for (const std::string& known : schema.nameSpaces()) {
-        if (equalNames(known, nameSpace)) {
-            return known;
-        }
-    }
-    return nameSpace;
 }
 
 } // namespace
@@ -84,26 +76,12 @@ Subscriptions::Entry Subscriptions::remove(SubscriptionId id) {
 Subscriptions::Entry Subscriptions::makeEntry(const std::string& nameSpace, const std::string& text,
                                               const std::string& language,
                                               const ObjectManager::IndicationSink& sink) const {
-    if (!_schema.hasNameSpace(nameSpace)) {
-        requireClass(_schema, nameSpace, ""); // says which namespaces there are
+    filter::Filter filter = readQuery(_schema, nameSpace, text, language, "the filter");
+    const Class& definition = *_schema.findClass(nameSpace, filter.className());
+    if (const std::string fault = indicationFault(definition); !fault.empty()) {
+        throw RequestError(CMPI_RC_ERR_INVALID_CLASS, fault);
     }
-    const auto known = filter::readLanguage(language);
-    if (!known) {
-        throw RequestError(CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED,
-                           "unknown query language '" + language + "', known are WQL and CQL");
-    }
-    try {
-        filter::Filter parsed = filter::Filter::parse(text, *known);
-        parsed.check(_schema, nameSpace);
-        const Class& definition = *_schema.findClass(nameSpace, parsed.className());
-        if (const std::string fault = indicationFault(definition); !fault.empty()) {
-            throw RequestError(CMPI_RC_ERR_INVALID_CLASS, fault);
-        }
-        return std::make_shared<Subscription>(_broker, std::move(parsed), spellingOf(_schema, nameSpace),
-                                              definition.name, sink);
-    } catch (const filter::Error& error) {
-        throw RequestError(error.code(), "the filter is refused: " + std::string(error.what()));
-    }
+    return std::make_shared<Subscription>(_broker, std::move(filter), nameSpace, definition.name, sink);
 }
 
 /**
@@ -139,7 +117,7 @@ std::vector<Subscription::Activation> Subscriptions::servicesOf(const Subscripti
 /** All steps for one provider and class, or none of them. */
 Status Subscriptions::activate(Subscription& entry, const Subscription::Activation& activation) {
     Provider& provider = *activation.provider;
-    IndicationCall call(_broker, provider, _principal, entry.filterHandle(), entry.nameSpace(), entry.fromClass(),
+    IndicationCall call(_broker, provider, entry.filterHandle(), entry.nameSpace(), entry.fromClass(),
                         activation.className);
     int& ofClass = _activations[{&provider, entry.nameSpace(), activation.className}];
     int& ofProvider = _activationsOfProvider[&provider];
@@ -168,7 +146,7 @@ Status Subscriptions::activate(Subscription& entry, const Subscription::Activati
 
 Status Subscriptions::deactivate(const Subscription& entry, const Subscription::Activation& activation) {
     Provider& provider = *activation.provider;
-    IndicationCall call(_broker, provider, _principal, entry.filterHandle(), entry.nameSpace(), entry.fromClass(),
+    IndicationCall call(_broker, provider, entry.filterHandle(), entry.nameSpace(), entry.fromClass(),
                         activation.className);
     int& ofClass = _activations[{&provider, entry.nameSpace(), activation.className}];
     int& ofProvider = _activationsOfProvider[&provider];
@@ -250,8 +228,9 @@ void Subscriptions::end() {
 }
 
 /** The indication as its class has it; nothing, and why, when it is none. */
-std::optional<Instance> Subscriptions::check(const std::string& nameSpace, Instance&& indication,
+std::optional<Instance> Subscriptions::check(const std::string& given, Instance&& indication,
                                              broker::Outcome& outcome) {
+    const std::string nameSpace = spellNameSpace(_schema, given);
     const std::string& className = indication.path.className;
     const auto deliverer = std::find_if(_providers.begin(), _providers.end(), [&](const auto& provider) {
         return provider->serves(ProviderKind::indication, nameSpace, className);
@@ -266,8 +245,7 @@ std::optional<Instance> Subscriptions::check(const std::string& nameSpace, Insta
         if (!fault.empty()) {
             throw RequestError(CMPI_RC_ERR_INVALID_CLASS, fault);
         }
-        const std::string spelling = spellingOf(_schema, nameSpace);
-        InstanceChecks checks(_schema, spelling, definition, name, _log);
+        InstanceChecks checks(_schema, nameSpace, definition, name, _log);
         auto checked = checks.checkInstance(std::move(indication), std::nullopt);
         if (!checked) {
             outcome = {CMPI_RC_ERR_INVALID_PARAMETER, "the indication's path has keys that its class has not"};

@@ -35,15 +35,10 @@ class Subscriptions {
 
     /** All outlive this. */
     Subscriptions(const Schema& schema, const SchemaKnowledge& knowledge, const broker::Broker& broker,
-                  const Providers& providers, const std::string& principal, OnceLog& log)
-        : _schema(schema),
-          _knowledge(knowledge),
-          _broker(broker),
-          _providers(providers),
-          _principal(principal),
-          _log(log) {}
+                  const Providers& providers, OnceLog& log)
+        : _schema(schema), _knowledge(knowledge), _broker(broker), _providers(providers), _log(log) {}
 
-    /** As ObjectManager::subscribe; throws RequestError. */
+    /** As ObjectManager::subscribe, the namespace spelled as the schema has it; throws RequestError. */
     Status subscribe(const std::string& nameSpace, const std::string& text, const std::string& language,
                      const ObjectManager::IndicationSink& sink, SubscriptionId& id);
     Status unsubscribe(SubscriptionId id);
@@ -70,13 +65,12 @@ class Subscriptions {
     Status activate(Subscription& entry, const Subscription::Activation& activation);
     Status deactivate(const Subscription& entry, const Subscription::Activation& activation);
     Status deactivateAll(Subscription& entry);
-    std::optional<Instance> check(const std::string& nameSpace, Instance&& indication, broker::Outcome& outcome);
+    std::optional<Instance> check(const std::string& given, Instance&& indication, broker::Outcome& outcome);
 
     const Schema& _schema;
     const SchemaKnowledge& _knowledge;
     const broker::Broker& _broker;
     const Providers& _providers;
-    const std::string& _principal;
     OnceLog& _log;
 
     std::mutex _setupMutex; ///< held while providers are told; guards the three below

@@ -71,8 +71,8 @@ ObjectManagerOptions findDirectories(const DirectoryOptions& named) {
     const fs::path installed = root / MARLO_INSTALLED_LIBRARIES;
     const fs::path libraries = fs::exists(installed, ignored) ? installed : root / "lib/marlo";
     ObjectManagerOptions options;
-    options.schemaDirectory = choose(named.schema, root / "share/marlo/schema");
-    options.providerDirectory = choose(named.providers, root / "share/marlo/providers");
+    options.schemaDirectories = {choose(named.schema, root / "share/marlo/schema")};
+    options.providerDirectories = {choose(named.providers, root / "share/marlo/providers")};
     options.libraryDirectory = choose(named.libraries, libraries);
     return options;
 }

@@ -38,8 +38,9 @@ struct ObjectPath {
 
     /**
      * Reads a path: `Class`, `Class.Key=value,...`, `namespace:Class...`, `//host/namespace:Class...`; values are
-     * quoted strings with `\"` and `\\`, integers, booleans, and quoted paths where the class says reference. Throws
-     * std::invalid_argument with the position and what was expected there.
+     * quoted strings with `\"` and `\\`, integers, booleans, and quoted paths where the class says reference. The
+     * slashes may be missing before a host that cannot be the beginning of a namespace (`127.0.0.1/root/x:Class`).
+     * Throws std::invalid_argument with the position and what was expected there.
      */
     static ObjectPath parse(std::string_view text);
 

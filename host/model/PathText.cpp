@@ -99,7 +99,10 @@ class PathReader {
     ObjectPath read() {
         ObjectPath path;
         if (_text.substr(0, 2) == "//") {
-            path.host = readHost();
+            path.host = readHost(2);
+            path.nameSpace = readNameSpace();
+        } else if (namesHost()) {
+            path.host = readHost(0);
             path.nameSpace = readNameSpace();
         } else if (namesNameSpace()) {
             path.nameSpace = readNameSpace();
@@ -136,8 +139,15 @@ class PathReader {
         return found != std::string_view::npos && _text[found] == ':';
     }
 
-    std::string readHost() {
-        _at = 2;
+    /** A part before the first '/' that has what only hosts have: points, a port, or a digit in front. */
+    [[nodiscard]] bool namesHost() const {
+        const std::string_view first = _text.substr(0, _text.find_first_of("/=\"'"));
+        return first.size() < _text.size() && _text[first.size()] == '/' && !first.empty() &&
+               (isDigit(first.front()) || first.find_first_of(".:") != std::string_view::npos);
+    }
+
+    std::string readHost(std::size_t start) {
+        _at = start;
         const auto end = _text.find('/', _at);
         if (end == std::string_view::npos) {
             _at = _text.size();

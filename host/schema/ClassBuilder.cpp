@@ -93,10 +93,12 @@ void ClassBuilder::inherit() {
     _class.properties = _superClass->properties;
     for (Property& property : _class.properties) {
         property.qualifiers = propagate(property.qualifiers);
+        property.propagated = true;
     }
     _class.methods = _superClass->methods;
     for (Method& method : _class.methods) {
         method.qualifiers = propagate(method.qualifiers);
+        method.propagated = true;
         for (Parameter& parameter : method.parameters) {
             parameter.qualifiers = propagate(parameter.qualifiers);
         }

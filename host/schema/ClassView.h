@@ -20,10 +20,16 @@ struct ClassFilter {
     std::optional<std::vector<std::string>> properties; ///< others are left out; methods stay
 };
 
-/** A copy with what the filter leaves. Names that the class does not have are overlooked. */
-Class viewClass(const Schema& schema, std::string_view nameSpace, const Class& definition, const ClassFilter& filter);
+/**
+ * A copy with what the filter leaves. Property names that the class does not have are overlooked. Without class
+ * origins, `origin` is empty throughout; without qualifiers, there are none of parameters either.
+ */
+Class viewClass(const Class& definition, const ClassFilter& filter);
 
-/** Below a class, or below the roots where `className` is empty: the direct subclasses, or all with `deep`. */
+/**
+ * Below a class: the direct subclasses, or all with `deep`. Where `className` is empty: the classes without a
+ * superclass, or all. Each after its superclass; none for an unknown class.
+ */
 std::vector<const Class*> subclasses(const Schema& schema, std::string_view nameSpace, std::string_view className,
                                      bool deep);
 

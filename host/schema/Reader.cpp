@@ -83,6 +83,7 @@ class Reader {
     int _depth = 0;
 };
 
+/** In the order of their names. */
 std::vector<std::string> listMofFiles(const std::string& directory) {
     std::vector<std::string> paths;
     std::error_code error;
@@ -94,25 +95,37 @@ std::vector<std::string> listMofFiles(const std::string& directory) {
     if (error) {
         throw std::runtime_error("cannot read the schema directory " + directory + ": " + error.message());
     }
-    if (paths.empty()) {
-        throw std::runtime_error("no *.mof files in the schema directory " + directory);
-    }
     std::sort(paths.begin(), paths.end());
     return paths;
 }
 
+std::string joined(const std::vector<std::string>& words) {
+    std::string text;
+    for (const std::string& word : words) {
+        text += (text.empty() ? "" : ", ") + word;
+    }
+    return text;
+}
+
 } // namespace
 
-Declarations readDirectory(const std::string& directory) {
+Declarations readDirectories(const std::vector<std::string>& directories) {
     Reader reader;
-    for (const std::string& path : listMofFiles(directory)) {
-        try {
-            reader.readFile(path, "");
-        } catch (const Error&) {
-            throw;
-        } catch (const std::runtime_error& error) {
-            throw std::runtime_error("cannot read " + path + ": " + error.what());
+    bool isEmpty = true;
+    for (const std::string& directory : directories) {
+        for (const std::string& path : listMofFiles(directory)) {
+            isEmpty = false;
+            try {
+                reader.readFile(path, "");
+            } catch (const Error&) {
+                throw;
+            } catch (const std::runtime_error& error) {
+                throw std::runtime_error("cannot read " + path + ": " + error.what());
+            }
         }
+    }
+    if (isEmpty) {
+        throw std::runtime_error("no *.mof files in the schema directory " + joined(directories));
     }
     return reader.take();
 }

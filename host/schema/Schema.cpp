@@ -89,8 +89,12 @@ Schema::Schema(Schema&&) noexcept = default;
 Schema& Schema::operator=(Schema&&) noexcept = default;
 
 Schema Schema::readDirectory(const std::string& directory) {
+    return readDirectories({directory});
+}
+
+Schema Schema::readDirectories(const std::vector<std::string>& directories) {
     Schema schema;
-    schema._state->model = mof::resolve(mof::readDirectory(directory));
+    schema._state->model = mof::resolve(mof::readDirectories(directories));
     return schema;
 }
 
@@ -110,6 +114,11 @@ std::vector<std::string> Schema::nameSpaces() const {
 
 bool Schema::hasNameSpace(std::string_view nameSpace) const {
     return _state->find(nameSpace) != nullptr;
+}
+
+const std::string* Schema::findNameSpace(std::string_view nameSpace) const {
+    const mof::NameSpace* const found = _state->find(nameSpace);
+    return found == nullptr ? nullptr : &found->name;
 }
 
 const Class* Schema::findClass(std::string_view nameSpace, std::string_view className) const {

@@ -49,6 +49,7 @@ struct Property {
     Qualifiers qualifiers;
     std::string origin; ///< the class that introduced it
     bool key = false;
+    bool propagated = false; ///< inherited, not declared again in the class itself
 };
 
 struct Parameter {
@@ -66,6 +67,7 @@ struct Method {
     std::vector<Parameter> parameters;
     Qualifiers qualifiers;
     std::string origin;
+    bool propagated = false;
 };
 
 /** A class with everything it inherits: properties and methods of the superclasses first, overrides in their place.
@@ -105,11 +107,16 @@ class Schema {
      */
     static Schema readDirectory(const std::string& directory);
 
+    /** The same of several directories, one after the other. One may be without files, but not all. */
+    static Schema readDirectories(const std::vector<std::string>& directories);
+
     /** The same from one text, for tests; `name` stands for the file in messages. */
     static Schema readText(std::string_view text, const std::string& name);
 
     [[nodiscard]] std::vector<std::string> nameSpaces() const;
     [[nodiscard]] bool hasNameSpace(std::string_view nameSpace) const;
+    /** A namespace as the schema spells it, or null. */
+    [[nodiscard]] const std::string* findNameSpace(std::string_view nameSpace) const;
     [[nodiscard]] const Class* findClass(std::string_view nameSpace, std::string_view className) const;
     /** All classes of a namespace, each after its superclass. */
     [[nodiscard]] std::vector<const Class*> classes(std::string_view nameSpace) const;

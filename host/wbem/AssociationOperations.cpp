@@ -41,8 +41,7 @@ Status writeClasses(Call& call, const Classes& classes) {
     filter.includeClassOrigin = form.classOrigin;
     filter.properties = call.arguments.propertyList();
     for (const Class* definition : classes) {
-        call.reply.returned().classWithPath(
-            call.nameSpace, viewClass(call.manager.schema(), call.nameSpace, *definition, filter), form);
+        call.reply.returned().classWithPath(call.nameSpace, viewClass(*definition, filter), form);
     }
     call.reply.returned();
     return {};

@@ -30,7 +30,7 @@ void writeClass(Call& call, const Class& definition, const ClassFilter& filter) 
     cimxml::Form form;
     form.qualifiers = filter.includeQualifiers;
     form.classOrigin = filter.includeClassOrigin;
-    call.reply.returned().classDefinition(viewClass(call.manager.schema(), call.nameSpace, definition, filter), form);
+    call.reply.returned().classDefinition(viewClass(definition, filter), form);
 }
 
 /** The classes below the one of the parameter ClassName, or below none. */

@@ -86,8 +86,8 @@ class AdapterChanges : public testing::Test {
     AdapterChanges() {
         std::ofstream(treeFile()) << ThreeAdapters;
         ObjectManagerOptions options;
-        options.schemaDirectory = MARLO_SHARE "/schema";
-        options.providerDirectory = MARLO_SHARE "/providers";
+        options.schemaDirectories = {MARLO_SHARE "/schema"};
+        options.providerDirectories = {MARLO_SHARE "/providers"};
         options.libraryDirectory = MARLO_LIBRARIES;
         options.log = [](const std::string&) {};
         manager = std::make_unique<ObjectManager>(options);

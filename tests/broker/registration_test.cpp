@@ -11,7 +11,7 @@ namespace {
 class Registrations : public testing::Test {
   protected:
     std::vector<Registration> read() {
-        return readRegistrations((site.directory() / "providers").string(), "/libraries", schema);
+        return readRegistrations({(site.directory() / "providers").string()}, "/libraries", schema);
     }
 
     /** Reads "providers/a.toml" with this text; the message of the refusal without the directory. */
@@ -118,7 +118,7 @@ TEST_F(Registrations, RefuseADirectoryThatCannotBeRead) {
     EXPECT_THROW(
         {
             try {
-                readRegistrations("/nonexistent/providers", "", schema);
+                readRegistrations({"/nonexistent/providers"}, "", schema);
             } catch (const std::runtime_error& error) {
                 EXPECT_THAT(error.what(), testing::HasSubstr("/nonexistent/providers: cannot read"));
                 throw;

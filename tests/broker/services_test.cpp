@@ -270,7 +270,6 @@ TEST_F(UpCallServices, OfOtherKindsAreNotSupported) {
     expectRefused(bft->references(mb, context, name, "", "", nullptr, &status) == nullptr);
     expectRefused(bft->referenceNames(mb, context, name, "", "", &status) == nullptr);
     expectRefused(CBInvokeMethod(mb, context, name, "Do", args, args, &status).state == CMPI_nullValue);
-    expectRefused(bft->getProperty(mb, context, name, "Id", &status).state == CMPI_nullValue);
     expectRefused(bft->enumerateInstancesFiltered(mb, context, name, nullptr, "", "", &status) == nullptr);
     expectRefused(bft->associatorsFiltered(mb, context, name, "", "", "", "", nullptr, "", "", &status) == nullptr);
     expectRefused(bft->referencesFiltered(mb, context, name, "", "", nullptr, "", "", &status) == nullptr);

@@ -16,8 +16,8 @@ class PlatformBySuperclass : public testing::Test {
   protected:
     static ObjectManagerOptions options() {
         ObjectManagerOptions options;
-        options.schemaDirectory = MARLO_SHARE_DIR "/schema";
-        options.providerDirectory = MARLO_SHARE_DIR "/providers";
+        options.schemaDirectories = {MARLO_SHARE_DIR "/schema"};
+        options.providerDirectories = {MARLO_SHARE_DIR "/providers"};
         options.libraryDirectory = MARLO_LIBRARY_DIR;
         return options;
     }

@@ -58,8 +58,8 @@ class ProviderSite {
     /** What the object manager logs goes to lines(). */
     [[nodiscard]] std::unique_ptr<ObjectManager> start(const std::string& libraryDirectory) {
         ObjectManagerOptions options;
-        options.schemaDirectory = (_directory / "schema").string();
-        options.providerDirectory = (_directory / "providers").string();
+        options.schemaDirectories = {(_directory / "schema").string()};
+        options.providerDirectories = {(_directory / "providers").string()};
         options.libraryDirectory = libraryDirectory;
         options.log = [this](const std::string& line) {
             const std::lock_guard lock(_mutex);
