@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <stdexcept>
+#include <utility>
 
 namespace Orv::Agent::Persistence {
 
@@ -29,7 +30,7 @@ std::string InterfacesFiles::mainPath(const std::string& root) {
     return root + mainFileName;
 }
 
-InterfacesFiles::InterfacesFiles(const std::string& root) : _root(root) {
+InterfacesFiles::InterfacesFiles(std::string root) : _root(std::move(root)) {
     readFile(mainFileName, 0);
 }
 

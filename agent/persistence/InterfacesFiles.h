@@ -38,7 +38,7 @@ class InterfacesFiles {
      * `root` as in Environment. Throws std::runtime_error when a file that counts cannot be read, or when files
      * source one another without end.
      */
-    explicit InterfacesFiles(const std::string& root);
+    explicit InterfacesFiles(std::string root);
 
     InterfacesFiles(const InterfacesFiles&) = delete;
     InterfacesFiles& operator=(const InterfacesFiles&) = delete;

@@ -309,9 +309,9 @@ void KernelWriter::restore(const InterfaceTables& before) {
         }
     }
     if (!sameAddresses(present.addresses, before.addresses)) {
-        for (auto address = present.addresses.rbegin(); address != present.addresses.rend(); ++address) {
-            steps.add(RTM_DELADDR, 0, *address, "removing an address again");
-        }
+        std::for_each(present.addresses.rbegin(), present.addresses.rend(), [&steps](const AddressObject& address) {
+            steps.add(RTM_DELADDR, 0, address, "removing an address again");
+        });
         for (const AddressObject& address : before.addresses) {
             steps.add(RTM_NEWADDR, NLM_F_CREATE | NLM_F_REPLACE, address, "putting back an address");
         }

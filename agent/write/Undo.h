@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include <algorithm>
 #include <exception>
 #include <functional>
 #include <string>
@@ -23,14 +24,14 @@ class Undo {
      */
     std::string run() {
         std::string failures;
-        for (auto step = _steps.rbegin(); step != _steps.rend(); ++step) {
+        std::for_each(_steps.rbegin(), _steps.rend(), [&failures](const std::function<void()>& step) {
             try {
-                (*step)();
+                step();
             } catch (const std::exception& failure) {
                 failures += "; and what was there before could not be put back: ";
                 failures += failure.what();
             }
-        }
+        });
         _steps.clear();
         return failures;
     }
