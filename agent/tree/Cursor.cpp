@@ -20,13 +20,8 @@ std::shared_ptr<const Cursor::View> Cursor::takeView() const {
     return std::make_shared<const View>(View{_backEnd.snapshot(), &_backEnd});
 }
 
-void Cursor::clear() {
-    _selection = {};
-    _single.reset();
-}
-
 void Cursor::select(NodeLexicon::NodeType type) {
-    clear();
+    _selection = {};
     _view = takeView();
     _selection = _view->tree->nodesOfType(type);
 }
@@ -35,17 +30,17 @@ bool Cursor::selectIn(std::shared_ptr<const View> view, const std::string& path)
     if (view == nullptr || view->source != &_backEnd) {
         return false;
     }
-    _single = view->tree->find(path);
-    if (_single == nullptr) {
+    const Tree::NodePointer& found = view->tree->find(path);
+    if (found == nullptr) {
         return false;
     }
-    _selection = {&_single, 1};
+    _selection = {&found, 1};
     _view = std::move(view);
     return true;
 }
 
 void Cursor::select(const std::string& path) {
-    clear();
+    _selection = {};
     if (const auto moment = _backEnd.events().pickUp(path)) {
         selectIn(std::make_shared<const View>(View{moment->tree, &_backEnd}), moment->path);
         return;

@@ -61,14 +61,12 @@ class Cursor {
     [[nodiscard]] const PropertyValue* find(NodeLexicon::Properties property) const;
     [[nodiscard]] std::shared_ptr<const View> takeView() const;
     bool selectIn(std::shared_ptr<const View> view, const std::string& path);
-    void clear();
 
     static std::weak_ptr<const View>& viewOfLastPath();
 
     BackEnd& _backEnd;
     std::shared_ptr<const View> _view;
-    Tree::NodePointer _single;                     ///< what a selection by path found
-    std::span<const Tree::NodePointer> _selection; ///< from the node under the cursor on; in _view or _single
+    std::span<const Tree::NodePointer> _selection; ///< from the node under the cursor on; in the tree of _view
 };
 
 } // namespace Orv::Agent

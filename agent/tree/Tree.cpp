@@ -1,21 +1,32 @@
 #include "agent/tree/Tree.h"
 
+#include <bit>
+#include <functional>
 #include <utility>
 
 namespace Orv::Agent {
 
-Tree::Tree(std::vector<NodePointer> nodes) {
+namespace {
+
+std::uint32_t hashOf(std::string_view path) {
+    return static_cast<std::uint32_t>(std::hash<std::string_view>()(path));
+}
+
+} // namespace
+
+Tree::Tree(std::vector<NodePointer> nodes) : _slots(std::bit_ceil(2 * nodes.size() + 1)) {
     _nodes.reserve(nodes.size());
-    _byPath.max_load_factor(0.5F);
-    _byPath.reserve(nodes.size());
     for (NodePointer& node : nodes) {
-        if (!_byPath.emplace(node->path, node).second) {
+        const std::uint32_t hash = hashOf(node->path);
+        Slot& slot = _slots[slotOf(node->path, hash)];
+        if (slot.place != 0) {
             continue;
         }
         if (node->type) {
             _byType[*node->type].push_back(node);
         }
         _nodes.push_back(std::move(node));
+        slot = {hash, static_cast<std::uint32_t>(_nodes.size())};
     }
 }
 
@@ -25,9 +36,23 @@ const std::vector<Tree::NodePointer>& Tree::nodesOfType(NodeLexicon::NodeType ty
     return found == _byType.end() ? none : found->second;
 }
 
-Tree::NodePointer Tree::find(std::string_view path) const {
-    const auto found = _byPath.find(path);
-    return found == _byPath.end() ? nullptr : found->second;
+/** The slot that leads to the path, or the free one where it would be put. */
+std::size_t Tree::slotOf(std::string_view path, std::uint32_t hash) const {
+    const std::size_t mask = _slots.size() - 1;
+    std::size_t at = hash & mask;
+    while (_slots[at].place != 0 && (_slots[at].hash != hash || _nodes[_slots[at].place - 1]->path != path)) {
+        at = (at + 1) & mask;
+    }
+    return at;
+}
+
+const Tree::NodePointer& Tree::find(std::string_view path) const {
+    static const NodePointer none;
+    if (_slots.empty()) {
+        return none;
+    }
+    const Slot& slot = _slots[slotOf(path, hashOf(path))];
+    return slot.place == 0 ? none : _nodes[slot.place - 1];
 }
 
 } // namespace Orv::Agent

@@ -7,12 +7,13 @@
 #include "agent/tree/PropertyMap.h"
 #include "instrumentation/NodeLexicon.h"
 
+#include <cstddef>
+#include <cstdint>
 #include <map>
 #include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <unordered_map>
 #include <vector>
 
 namespace Orv::Agent {
@@ -45,16 +46,26 @@ class Tree {
     /** The nodes of a type in iteration order. */
     [[nodiscard]] const std::vector<NodePointer>& nodesOfType(NodeLexicon::NodeType type) const;
 
-    /** The node at a path, or null. */
-    [[nodiscard]] NodePointer find(std::string_view path) const;
+    /** The node at a path, or null; the reference is good as long as the tree. */
+    [[nodiscard]] const NodePointer& find(std::string_view path) const;
 
     /** All nodes in iteration order. */
     [[nodiscard]] const std::vector<NodePointer>& nodes() const { return _nodes; }
 
   private:
+    /** Where a path leads. Free when `place` is 0. */
+    struct Slot {
+        std::uint32_t hash = 0;  ///< of the path; saves a look at a node, far off in memory, that has another
+        std::uint32_t place = 0; ///< of the node in _nodes, from 1
+    };
+
+    [[nodiscard]] std::size_t slotOf(std::string_view path, std::uint32_t hash) const;
+
     std::vector<NodePointer> _nodes;
     std::map<NodeLexicon::NodeType, std::vector<NodePointer>> _byType;
-    std::unordered_map<std::string_view, NodePointer> _byPath; ///< keys point into the nodes
+    /** A power of two of them, at most half of them taken. One block and no pointers, so that a tree of ten thousand
+     *  nodes is put together and searched without a trip to memory per node. */
+    std::vector<Slot> _slots;
 };
 
 } // namespace Orv::Agent

@@ -1,6 +1,8 @@
 #include "agent/tree/Tree.h"
 #include "tests/agent/FakeBackEnd.h"
 
+#include <algorithm>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -73,6 +75,25 @@ TEST(Tree, FindsANodeByItsPathWhole) {
     EXPECT_EQ(tree.find("a")->path, "a");
     EXPECT_EQ(tree.find("hos"), nullptr);
     EXPECT_EQ(tree.find(""), nullptr);
+    EXPECT_EQ(Tree().find("a"), nullptr);
+}
+
+// So many paths that some of them agree in all 32 bits of their hashes.
+TEST(Tree, FindsEachOfManyNodesAndNoOther) {
+    constexpr int count = 300000;
+    std::vector<Tree::NodePointer> nodes;
+    for (int i = 0; i < count; ++i) {
+        nodes.push_back(makeNode(std::to_string(i), "", {}));
+    }
+    const Tree tree(nodes);
+    ASSERT_EQ(tree.nodes().size(), nodes.size());
+    EXPECT_TRUE(
+        std::all_of(nodes.begin(), nodes.end(), [&](const auto& node) { return tree.find(node->path) == node; }));
+    int strangers = 0;
+    for (int i = count; i < 2 * count; ++i) {
+        strangers += tree.find(std::to_string(i)) == nullptr ? 0 : 1;
+    }
+    EXPECT_EQ(strangers, 0);
 }
 
 TEST(Tree, DropsTheLaterOfTwoNodesOfOnePath) {
