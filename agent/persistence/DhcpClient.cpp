@@ -14,6 +14,8 @@
 #include <stdexcept>
 #include <system_error>
 
+#include <sys/stat.h>
+
 namespace Orv::Agent::Persistence {
 
 namespace {
@@ -89,12 +91,21 @@ Texts argumentsOf(pid_t process) {
     return arguments;
 }
 
-/** The same interface name may be another interface in another container. */
+/** The inode of a file in /proc that every network namespace has one of, or 0. */
+ino_t namespaceOf(const std::string& process) {
+    struct stat status {};
+
+    return ::stat(("/proc/" + process + "/net/dev").c_str(), &status) == 0 ? status.st_ino : 0;
+}
+
+/**
+ * The same interface name may be another interface in another container. The link /proc/PID/ns/net would tell, too,
+ * but only those who may trace the process (ptrace(2)): a client that was started at boot can do more than this
+ * process.
+ */
 bool isInThisNamespace(pid_t process) {
-    std::error_code error;
-    const auto here = std::filesystem::read_symlink("/proc/thread-self/ns/net", error);
-    const auto there = std::filesystem::read_symlink("/proc/" + std::to_string(process) + "/ns/net", error);
-    return !error && here == there;
+    const ino_t there = namespaceOf(std::to_string(process));
+    return there != 0 && there == namespaceOf("thread-self");
 }
 
 void end(pid_t process, const std::string& interface) {
