@@ -1,8 +1,8 @@
 #include "host/security/Gatekeeper.h"
+#include "tests/security/TemporaryDirectory.h"
 #include "tests/support/Namespace.h"
 
 #include <chrono>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <memory>
@@ -22,16 +22,6 @@ using marlo::security::PasswordCheck;
 /** A directory of services, as /etc/pam.d. */
 class PamTest : public testing::Test {
   protected:
-    PamTest() {
-        std::string name = (fs::temp_directory_path() / "marlo-pam-XXXXXX").string();
-        if (mkdtemp(name.data()) == nullptr) {
-            throw std::runtime_error(name);
-        }
-        _directory = name;
-    }
-
-    ~PamTest() override { fs::remove_all(_directory); }
-
     void write(const std::string& service, const std::string& rules) const {
         std::ofstream(_directory / service) << rules;
     }
@@ -42,7 +32,8 @@ class PamTest : public testing::Test {
         return makePamCheck("test", _directory);
     }
 
-    fs::path _directory;
+    const marlo::test::TemporaryDirectory _temporary;
+    const fs::path _directory = _temporary.path();
 };
 
 TEST_F(PamTest, IsGoodWhenTheModulesSaySo) {
