@@ -27,6 +27,7 @@ void readFlavors(const Node& node, T& qualifier) {
 Qualifier readQualifier(const Node& node) {
     Qualifier qualifier;
     qualifier.name = node.require("NAME");
+    qualifier.propagated = node.isTrue("PROPAGATED", false);
     readFlavors(node, qualifier);
     const CMPIType type = readType(node);
     const auto children = node.children();

@@ -23,8 +23,10 @@ class TagScan {
                 skipBehind("]]>", 9);
             } else if (startsWith("<?")) {
                 skipBehind("?>", 2);
+            } else if (startsWith("<!DOCTYPE")) {
+                scanDoctype();
             } else if (startsWith("<!")) {
-                scanDeclaration();
+                failAt(_text, _at, Kind::notWellFormed, "markup that begins with '<!' and is none");
             } else {
                 scanTag();
             }
@@ -45,7 +47,7 @@ class TagScan {
         return end == std::string_view::npos ? _text.size() : end + 1;
     }
 
-    void scanDeclaration() {
+    void scanDoctype() {
         std::size_t at = _text.find_first_of("\"'>[", _at);
         while (at < _text.size() && _text[at] != '>') {
             if (_text[at] == '[') {
@@ -69,7 +71,10 @@ class TagScan {
             }
             at = _text.find_first_of("\"'=<>", _text[at] == '=' ? at + 1 : behindQuotes(at));
         }
-        _at = std::min(at, _text.size());
+        if (at >= _text.size()) {
+            failAt(_text, _at, Kind::notWellFormed, "a tag that does not end");
+        }
+        _at = at;
     }
 
     std::string_view _text;

@@ -47,6 +47,14 @@ std::optional<Value> readInteger(std::string_view text, CMPIType type) {
     return isSigned ? Value::sint(type, static_cast<std::int64_t>(number)) : Value::uint(type, number);
 }
 
+template <typename Real>
+std::optional<Value> readDigits(std::string_view text, CMPIType type) {
+    Real number = 0;
+    const char* const end = text.data() + text.size();
+    const auto result = std::from_chars(text.data(), end, number);
+    return result.ec == std::errc() && result.ptr == end ? std::optional(Value{type, double{number}}) : std::nullopt;
+}
+
 std::optional<Value> readReal(std::string_view text, CMPIType type) {
     for (const auto& [name, number] : {std::pair("INF", HUGE_VAL), std::pair("-INF", -HUGE_VAL),
                                        std::pair("NaN", std::numeric_limits<double>::quiet_NaN())}) {
@@ -58,11 +66,7 @@ std::optional<Value> readReal(std::string_view text, CMPIType type) {
     if (text.find_first_not_of("0123456789+-.eE") != std::string_view::npos) { // "inf" and the like
         return std::nullopt;
     }
-    double number = 0;
-    const char* const end = text.data() + text.size();
-    const auto result = std::from_chars(text.data(), end, number);
-    const bool fits = type == CMPI_real64 || std::abs(number) <= std::numeric_limits<float>::max();
-    return result.ec == std::errc() && result.ptr == end && fits ? std::optional(Value{type, number}) : std::nullopt;
+    return type == CMPI_real32 ? readDigits<float>(text, type) : readDigits<double>(text, type);
 }
 
 std::optional<Value> readBoolean(std::string_view text) {
