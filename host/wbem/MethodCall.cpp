@@ -27,7 +27,8 @@ NamedValue readNamed(const Method& method, const cimxml::NamedArgument& argument
 } // namespace
 
 Status callMethod(ObjectManager& manager, const cimxml::ExtrinsicCall& call, Reply& reply) {
-    const Class& definition = requireClass(manager.schema(), call.path.nameSpace, call.path.className);
+    const Class& definition =
+        requireClass(manager.schema(), manager.spell(call.path.nameSpace), call.path.className);
     const Method& method = requireMethod(definition, call.method);
     std::vector<NamedValue> arguments;
     for (const cimxml::NamedArgument& argument : call.arguments) {

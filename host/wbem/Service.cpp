@@ -120,19 +120,21 @@ struct Service::State {
 Status Service::State::callIntrinsic(const cimxml::IntrinsicCall& call, const security::Identity& identity,
                                      Reply& reply) {
     const Operation* operation = findOperation(call.method);
+    const std::string nameSpace = manager.spell(call.nameSpace);
     const security::Role role = operation == nullptr ? security::Role::read : operation->role();
-    requireRole(identity, roleFor(role, manager.schema(), call.nameSpace, subjectOf(call)), call.method);
+    requireRole(identity, roleFor(role, manager.schema(), nameSpace, subjectOf(call)), call.method);
     if (operation == nullptr) {
         return {CMPI_RC_ERR_NOT_SUPPORTED, "there is no operation '" + call.method + "'", {}};
     }
     const Arguments arguments(call, operation->parameters());
-    Call context{manager, enumerations, options.limits, identity, call.nameSpace, arguments, reply};
+    Call context{manager, enumerations, options.limits, identity, nameSpace, arguments, reply};
     return operation->run()(context);
 }
 
 Status Service::State::callExtrinsic(const cimxml::ExtrinsicCall& call, const security::Identity& identity,
                                      Reply& reply) {
-    requireRole(identity, roleFor(security::Role::change, manager.schema(), call.path.nameSpace, call.path.className),
+    const std::string nameSpace = manager.spell(call.path.nameSpace);
+    requireRole(identity, roleFor(security::Role::change, manager.schema(), nameSpace, call.path.className),
                 call.method);
     return callMethod(manager, call, reply);
 }
