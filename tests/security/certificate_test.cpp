@@ -1,11 +1,11 @@
 #include "host/security/Certificate.h"
 #include "host/security/SelfSigned.h"
 #include "host/security/WholeFile.h"
+#include "tests/security/Shell.h"
 #include "tests/security/TemporaryDirectory.h"
 
 #include <array>
 #include <chrono>
-#include <cstdio>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -15,7 +15,6 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 namespace {
@@ -34,23 +33,11 @@ using marlo::security::readWhole;
 using marlo::security::toPem;
 using marlo::security::writeWhole;
 using marlo::security::X509Certificate;
+using marlo::test::shell;
 using testing::HasSubstr;
 using testing::Not;
 
 constexpr auto day = std::chrono::hours(24);
-
-/** The output of a command, both streams, and its exit code where that is none of success. */
-std::string shell(const std::string& command) {
-    const std::string line = command + " 2>&1";
-    std::string output;
-    FILE* stream = popen(line.c_str(), "re");
-    std::array<char, 1024> piece{};
-    while (const std::size_t count = fread(piece.data(), 1, piece.size(), stream)) {
-        output.append(piece.data(), count);
-    }
-    const int status = pclose(stream);
-    return status == 0 ? output : output + "exit " + std::to_string(WEXITSTATUS(status));
-}
 
 std::string failureOf(const std::function<void()>& work) {
     try {

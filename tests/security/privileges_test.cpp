@@ -2,10 +2,13 @@
 #include "host/security/Gatekeeper.h"
 #include "host/security/Privileges.h"
 #include "tests/security/Child.h"
+#include "tests/security/Shell.h"
 #include "tests/security/TemporaryDirectory.h"
 #include "tests/support/Namespace.h"
 
+#include <algorithm>
 #include <array>
+#include <cctype>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
@@ -16,6 +19,7 @@
 #include <sstream>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <thread>
 
 #include <cap-ng.h>
@@ -40,6 +44,7 @@ namespace {
 
 using marlo::security::dropPrivileges;
 using marlo::test::inChild;
+using marlo::test::shell;
 using marlo::test::TemporaryDirectory;
 using testing::HasSubstr;
 
@@ -71,16 +76,6 @@ std::string statusLine(std::istream&& status, const std::string& name) {
 
 std::string ownStatus(const std::string& name) {
     return statusLine(std::ifstream("/proc/thread-self/status"), name);
-}
-
-std::string outputOf(const std::string& command) {
-    FILE* stream = popen(command.c_str(), "re");
-    std::string output;
-    std::array<char, 1024> piece{};
-    while (const std::size_t count = fread(piece.data(), 1, piece.size(), stream)) {
-        output.append(piece.data(), count);
-    }
-    return pclose(stream) == 0 ? output : output + "(failed)";
 }
 
 std::string outcome(int result) {
@@ -115,14 +110,42 @@ TEST_F(Privileges, AreSaid) {
               "sys_chroot, audit_write");
 }
 
+TEST_F(Privileges, AreThoseThatTheServiceUnitGrants) {
+    std::string granted;
+    std::ifstream unit(MARLO_UNIT);
+    for (std::string line; std::getline(unit, line);) {
+        if (constexpr std::string_view key = "CapabilityBoundingSet="; line.starts_with(key)) {
+            std::istringstream names(line.substr(key.size()));
+            for (std::string name; names >> name;) {
+                std::transform(name.begin(), name.end(), name.begin(),
+                               [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
+                granted += (granted.empty() ? "" : ", ") + name.substr(std::string_view("cap_").size());
+            }
+        }
+    }
+    EXPECT_EQ(inChild(dropPrivileges), "kept capabilities: " + granted);
+}
+
 TEST_F(Privileges, OfProgramsAreTheSame) {
     const std::string status = inChild([] {
         dropPrivileges();
-        return outputOf("cat /proc/self/status");
+        return shell("cat /proc/self/status");
     });
     EXPECT_EQ(statusLine(std::istringstream(status), "CapEff"), hex(kept));
     EXPECT_EQ(statusLine(std::istringstream(status), "CapBnd"), hex(kept));
     EXPECT_EQ(statusLine(std::istringstream(status), "NoNewPrivs"), "1");
+}
+
+TEST_F(Privileges, OfProgramsAreTheSameWhereTheBoundIsNotOursToSet) {
+    const std::string status = inChild([] {
+        capng_get_caps_process();
+        capng_update(CAPNG_DROP, static_cast<capng_type_t>(CAPNG_EFFECTIVE | CAPNG_PERMITTED), CAP_SETPCAP);
+        capng_apply(CAPNG_SELECT_CAPS);
+        dropPrivileges();
+        return ownStatus("CapBnd") == hex(kept) ? "nothing to test" : shell("cat /proc/self/status");
+    });
+    EXPECT_EQ(statusLine(std::istringstream(status), "CapEff"), hex(kept));
+    EXPECT_EQ(statusLine(std::istringstream(status), "CapPrm"), hex(kept));
 }
 
 TEST_F(Privileges, AreThoseOfThreadsThatStartLater) {
@@ -188,8 +211,7 @@ TEST_F(Privileges, SufficeToConfigureTheNetwork) {
                     std::strcpy(request.ifr_name, "lo");
                     request.ifr_flags = IFF_UP | IFF_LOOPBACK;
                     const std::string own = outcome(ioctl(socketNumber, SIOCSIFFLAGS, &request));
-                    return own + ", " +
-                           outputOf("ip address add 192.0.2.9/24 dev lo && ip -o -4 address show dev lo");
+                    return own + ", " + shell("ip address add 192.0.2.9/24 dev lo && ip -o -4 address show dev lo");
                 }),
                 testing::AllOf(testing::StartsWith("done, "), HasSubstr("192.0.2.9/24"), HasSubstr("127.0.0.1/8")));
 }
