@@ -19,6 +19,8 @@ namespace {
 /** A thread that delivers an event takes milliseconds; one that hangs shall not hang the end of the process. */
 constexpr std::chrono::seconds longestWaitForThreads(2);
 
+constexpr const char* interopNameSpace = "root/interop";
+
 /** Never destroyed: threads may outlive all static objects. */
 template <typename Thing>
 void keepForGood(std::unique_ptr<Thing> thing) {
@@ -36,9 +38,25 @@ struct ObjectManager::State {
           subscriptions(core.schema, core.knowledge, core.broker, core.providers, core.onceLog),
           operations(core) {
         upCalls.connect(operations, subscriptions);
-        if (auto interop = makeInterop(core.schema)) {
+        if (auto interop = makeInterop(core.schema, neighbours())) {
             core.add(std::move(interop));
         }
+    }
+
+    /** What the interop namespace's own classes need to know of the others there. */
+    InteropNeighbours neighbours() {
+        const auto isServed = [this](const std::string& className) {
+            return core.findServant(ProviderKind::instance, interopNameSpace, className).has_value();
+        };
+        const auto namesOf = [this, isServed](const std::string& className) {
+            std::vector<ObjectPath> names;
+            if (isServed(className)) {
+                static_cast<void>(operations.enumerateNames(
+                    interopNameSpace, className, [&names](ObjectPath&& name) { names.push_back(std::move(name)); }));
+            }
+            return names;
+        };
+        return {isServed, namesOf};
     }
 
     /** Ends all that providers were asked for; up-calls are refused from now on. */

@@ -102,7 +102,8 @@ ObjectPath parsePath(const Options& options) {
 }
 
 ExitCode runGet(ObjectManager& manager, const Options& options, Output& output) {
-    const ObjectPath path = parsePath(options);
+    ObjectPath path = parsePath(options);
+    path.nameSpace = manager.spell(path.nameSpace);
     requireProperties(manager.schema(), path.nameSpace, path.className, options.properties);
     InstancePrinter print(manager.schema(), options, output);
     const Status status = manager.getInstance(path, propertyList(options),
@@ -200,7 +201,9 @@ void orderBySchema(const Schema& schema, Instance& instance) {
         [&position](const NamedValue& left, const NamedValue& right) { return position(left) < position(right); });
 }
 
-ExitCode run(ObjectManager& manager, const Options& options, Output& output) {
+ExitCode run(ObjectManager& manager, const Options& given, Output& output) {
+    Options options = given;
+    options.nameSpace = manager.spell(given.nameSpace);
     switch (options.command) {
     case Command::Adapters:
         return runAdapters(manager, options, output);

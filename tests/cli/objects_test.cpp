@@ -140,6 +140,17 @@ TEST_F(MarloObjects, AreFoundInTheNamespaceOfTheirPath) {
 
 class MarloFixture : public FixtureTest {};
 
+TEST_F(MarloObjects, OfTheObjectManagerItselfAreInTheInteropNamespace) {
+    const auto json = marloJson({"enum", "-n", "interop", "CIM_Namespace", "-p", "Name"});
+    ASSERT_EQ(json.size(), 3U);
+    EXPECT_EQ(json[2]["properties"]["Name"], "root/interop");
+    const std::string path = json[2]["path"];
+    EXPECT_THAT(path, testing::StartsWith("root/interop:CIM_Namespace."));
+    EXPECT_EQ(marloJson({"get", path}).size(), 1U);
+    EXPECT_EQ(marlo({"enum", "-n", "/interop/", "CIM_Namespace", "-p", "Nothing"}).exitCode, 2);
+    EXPECT_THAT(marlo({"classes", "-n", "interop", "--names"}).out, HasSubstr("CIM_ObjectManager\n"));
+}
+
 TEST_F(MarloFixture, ValuesKeepTheirTypesInJson) {
     const auto json = marloJson(onFixture({"enum", "TEST_Typed"}));
     ASSERT_EQ(json.size(), 1U);
