@@ -1,39 +1,13 @@
-#include "tests/http/RawClient.h"
-#include "tests/http/ScriptedHandler.h"
+#include "tests/http/ServerFixture.h"
 
 #include <string>
 #include <vector>
 
-#include <gtest/gtest.h>
-
 namespace {
 
 using namespace marlo::http;
-using std::chrono::milliseconds;
 
-/** A server that is handed its connections, and asked what it is asked over TCP as well. */
-class Requests : public testing::Test {
-  protected:
-    Server& server() {
-        if (!_server) {
-            _server = std::make_unique<Server>(handler, std::vector{Endpoint()}, std::nullopt, limits, lines.sink());
-        }
-        return *_server;
-    }
-
-    RawClient client() { return RawClient::servedBy(server()); }
-
-    ScriptedHandler handler;
-    Limits limits;
-    Lines lines;
-
-  private:
-    std::unique_ptr<Server> _server;
-};
-
-std::string get(const std::string& target = "/") {
-    return "GET " + target + " HTTP/1.1\r\nHost: x\r\n\r\n";
-}
+using Requests = ServerFixture;
 
 TEST_F(Requests, AreAnsweredWithALength) {
     RawClient asking = client();
