@@ -136,6 +136,7 @@ void Connection::answerError(Reply& reply, const std::string& reason) {
 void Connection::conclude(Reply& reply) {
     _outcome = Outcome::answered;
     _output = reply.takeRest();
+    _sent = 0;
     _delay = reply.delay();
     _keepsAlive = reply.keepsAlive();
     _mustReset = reply.isBroken();

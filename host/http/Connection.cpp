@@ -1,6 +1,7 @@
 #include "host/http/Connection.h"
 
 #include "host/http/Roster.h"
+#include "host/http/Sockets.h"
 
 #include <cerrno>
 #include <utility>
@@ -48,6 +49,9 @@ void Connection::enter(State state, milliseconds time) {
 
 /** TLS may have decrypted more than was asked for: nothing on the descriptor would tell. */
 void Connection::awaitInput() {
+    if (_state != State::idle && _peer.transport != Transport::local) {
+        acknowledgeAtOnce(_readiness.descriptor());
+    }
     if (_stream->hasPending()) {
         _loop.post([self = shared_from_this()] { self->onReady(); });
     } else {
@@ -221,9 +225,9 @@ void Connection::nextRequest() {
 }
 
 void Connection::sendRest() {
-    while (!_output.empty()) {
-        const Transfer transfer = _stream->write(_output);
-        _output.erase(0, transfer.bytes);
+    while (_sent < _output.size()) {
+        const Transfer transfer = _stream->write(std::string_view(_output).substr(_sent));
+        _sent += transfer.bytes;
         if (transfer.progress == Progress::wantWrite) {
             _readiness.awaitWritable(shared_from_this());
             return;
@@ -238,6 +242,7 @@ void Connection::sendRest() {
         }
         _deadline = Clock::now() + _site.limits.sendTime;
     }
+    _output = std::string();
     answered();
 }
 

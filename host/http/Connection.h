@@ -99,7 +99,8 @@ class Connection : public Job, public ReadinessListener, public std::enable_shar
 
     Outcome _outcome = Outcome::answered;
     std::optional<Fault> _fault; ///< of a body
-    std::string _output;         ///< what the client has not taken yet
+    std::string _output;         ///< what the client did not take at once
+    std::size_t _sent = 0;       ///< of it, since
     std::chrono::milliseconds _delay{0};
     bool _keepsAlive = true;
     bool _mustReset = false;

@@ -183,4 +183,8 @@ void sendAtOnce(int descriptor) {
     setOption(descriptor, IPPROTO_TCP, TCP_NODELAY, 1);
 }
 
+void acknowledgeAtOnce(int descriptor) {
+    setOption(descriptor, IPPROTO_TCP, TCP_QUICKACK, 1);
+}
+
 } // namespace marlo::http

@@ -29,4 +29,10 @@ Peer peerOf(int descriptor, const sockaddr_storage& address, Transport transport
 /** Nothing waits for more to be sent with it: an answer that is given leaves at once. */
 void sendAtOnce(int descriptor);
 
+/**
+ * What came is acknowledged now and not with what is sent next: a client that has sent a head, and does as Nagle
+ * would (RFC 896), keeps the body back until then, and 40 ms are lost.
+ */
+void acknowledgeAtOnce(int descriptor);
+
 } // namespace marlo::http
