@@ -34,7 +34,7 @@ class TlsContext {
     std::unique_ptr<SSL_CTX, Free> _context;
 };
 
-/** The newest entry of OpenSSL's error queue of this thread as text; the queue is empty afterwards. */
+/** The first entry of OpenSSL's error queue of this thread, which is the cause of others; the queue is emptied. */
 std::string takeTlsError();
 
 } // namespace marlo::http

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <stdexcept>
+#include <system_error>
 
 #include <openssl/err.h>
 #include <openssl/ssl.h>
@@ -48,10 +49,13 @@ void loadTrust(SSL_CTX* context, const TlsOptions& options) {
 } // namespace
 
 std::string takeTlsError() {
-    const unsigned long code = ERR_peek_last_error();
+    const unsigned long code = ERR_peek_error();
     ERR_clear_error();
     if (code == 0) {
         return {};
+    }
+    if (ERR_SYSTEM_ERROR(code)) { // for which there is no text since OpenSSL 3
+        return std::generic_category().message(ERR_GET_REASON(code));
     }
     const char* reason = ERR_reason_error_string(code);
     if (reason != nullptr) {
