@@ -5,11 +5,10 @@
 #pragma once
 
 #include "agent/change/AdapterSettings.h"
+#include "fuzz/Require.h"
 
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -17,13 +16,7 @@
 
 namespace Orv::Fuzz {
 
-/** Ends the process when something that always holds does not. */
-inline void require(bool holds, const char* what) {
-    if (!holds) {
-        (void)std::fprintf(stderr, "does not hold: %s\n", what);
-        std::abort();
-    }
-}
+using marlo::fuzz::require;
 
 /** The first byte chooses the change, what follows is the text that it is made in. */
 inline std::pair<Agent::AdapterSettings, std::string_view> wantedAndText(const std::uint8_t* data, std::size_t size) {

@@ -2,6 +2,8 @@
 
 #include "host/cimxml/TypedText.h"
 
+#include <algorithm>
+
 namespace marlo::cimxml {
 
 namespace {
@@ -41,6 +43,19 @@ Value readKey(const Node& node, const Limits& limits) {
     return {CMPI_ref, std::make_shared<const ObjectPath>(readPath(node.onlyChild(), limits))};
 }
 
+/** The words between slashes: clients write more of these than they should, and whole names into one element. */
+std::vector<std::string_view> wordsOf(std::string_view text) {
+    std::vector<std::string_view> words;
+    while (!text.empty()) {
+        const std::string_view word = text.substr(0, text.find('/'));
+        text.remove_prefix(std::min(word.size() + 1, text.size()));
+        if (!word.empty()) {
+            words.push_back(word);
+        }
+    }
+    return words;
+}
+
 /** The name behind a namespace: the second of two children. */
 struct Located {
     std::string host;
@@ -71,7 +86,11 @@ std::string readNameSpace(const Node& node) {
         if (!part.is("NAMESPACE")) {
             part.failMisplaced();
         }
-        name += (name.empty() ? "" : "/") + part.require("NAME");
+        const std::string given = part.require("NAME");
+        for (const std::string_view word : wordsOf(given)) {
+            name += name.empty() ? "" : "/";
+            name += word;
+        }
     }
     if (name.empty()) {
         node.fail("a namespace without a name");

@@ -75,6 +75,18 @@ TEST(Message, OverlooksCorrelatorsUnknownAttributesCommentsAndInstructions) {
     EXPECT_EQ(std::get<IntrinsicCall>(message.call).nameSpace, "a");
 }
 
+TEST(Message, TakesNamespacesAsTheyAreMeant) {
+    const std::string document = intrinsic("Any", "");
+    for (const char* names :
+         {"<NAMESPACE NAME=\"root/cimv2\"/>", "<NAMESPACE NAME=\"//root/\"/><NAMESPACE NAME=\"/cimv2\"/>",
+          "<NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"\"/><NAMESPACE NAME=\"cimv2\"/>"}) {
+        std::string changed = document;
+        const std::string usual = "<NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"cimv2\"/>";
+        changed.replace(changed.find(usual), usual.size(), names);
+        EXPECT_EQ(std::get<IntrinsicCall>(readMessage(changed).call).nameSpace, "root/cimv2") << names;
+    }
+}
+
 struct Flaw {
     const char* replaced;
     const char* by;
@@ -136,6 +148,8 @@ INSTANTIATE_TEST_SUITE_P(
                          "line 3, column 165: IPARAMVALUE without NAME"},
                     Flaw{"<NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"cimv2\"/>", "", Kind::notValid,
                          "line 3, column 75: a namespace without a name"},
+                    Flaw{"<NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"cimv2\"/>", "<NAMESPACE NAME=\"/\"/>",
+                         Kind::notValid, "line 3, column 75: a namespace without a name"},
                     Flaw{"<IMETHODCALL NAME=\"A\">", "<IMETHODCALL>", Kind::notValid,
                          "line 3, column 53: IMETHODCALL without NAME"}));
 
