@@ -170,6 +170,21 @@ void appendInstanceName(std::string& out, const ObjectPath& path) {
     out += "</INSTANCENAME>";
 }
 
+/**
+ * An element of an array. VALUE.NULL came with version 2.2 of the representation, and answers are of version 2.0, whose
+ * clients may know no such element and give up on the whole answer: a text that is NULL goes out empty. For other
+ * types there is no other way to say it.
+ */
+void appendElement(std::string& out, const Value& element) {
+    if (!element.isNull()) {
+        appendScalar(out, element);
+    } else if (element.type == CMPI_string) {
+        out += "<VALUE></VALUE>";
+    } else {
+        out += "<VALUE.NULL/>";
+    }
+}
+
 } // namespace
 
 void appendValueText(std::string& out, const Value& value) {
@@ -187,11 +202,7 @@ void appendValue(std::string& out, const Value& value) {
     const bool areReferences = (value.type & ~CMPI_ARRAY) == CMPI_ref;
     out += areReferences ? "<VALUE.REFARRAY>" : "<VALUE.ARRAY>";
     for (const Value& element : *elements) {
-        if (element.isNull()) {
-            out += "<VALUE.NULL/>";
-        } else {
-            appendScalar(out, element);
-        }
+        appendElement(out, element);
     }
     out += areReferences ? "</VALUE.REFARRAY>" : "</VALUE.ARRAY>";
 }
