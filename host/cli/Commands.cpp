@@ -225,8 +225,10 @@ ExitCode run(ObjectManager& manager, const Options& given, Output& output) {
         return runWatch(manager, options, output);
     case Command::Classes:
         return runClasses(manager, options, output);
+    case Command::Serve:
+    case Command::Status:
     case Command::Completion:
-        break; // answered before there is an object manager
+        break; // run without the object manager that the others share
     }
     return Answered;
 }

@@ -35,7 +35,7 @@ _marlo_arguments() {
         case "${COMP_WORDS[i]}" in
         "$1") seen=1 ;;
         -n | --namespace | --tree | --agent-config | --schema | --providers | --libraries | --*-level | --*-sink) ((++i)) ;;
-        --mask | --gateway | --server | --search | --domain | -p | --property) ((++i)) ;;
+        --config | --socket | --http | --https | --mask | --gateway | --server | --search | --domain | -p | --property) ((++i)) ;;
         -*) ;;
         *) ((count += seen)) ;;
         esac
@@ -50,7 +50,7 @@ _marlo() {
 
 constexpr const char* ScriptTail = R"bash(
     case "$previous" in
-    --tree | --agent-config)
+    --tree | --agent-config | --config | --socket)
         mapfile -t COMPREPLY < <(compgen -f -- "$current")
         return
         ;;
@@ -67,7 +67,7 @@ constexpr const char* ScriptTail = R"bash(
         return
         ;;
     -n | --namespace)
-        mapfile -t COMPREPLY < <(compgen -W "root/tavis root/quarn" -- "$current")
+        mapfile -t COMPREPLY < <(compgen -W "root/tavis root/quarn root/interop" -- "$current")
         return
         ;;
     esac

@@ -27,4 +27,7 @@ void addNameSpace(CLI::App& app, Options& options);
 /** The commands that change an adapter or the host. */
 void addChangeCommands(CLI::App& app, Options& options);
 
+/** `serve` and `status`. */
+void addServerCommands(CLI::App& app, Options& options);
+
 } // namespace marlo::cli

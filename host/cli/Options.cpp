@@ -178,6 +178,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     addObjectCommands(app, line.options);
     addChangeCommands(app, line.options);
     addWatchCommand(app, line.options);
+    addServerCommands(app, line.options);
     addOtherCommands(app, line.options);
     try {
         app.parse(argc, argv);

@@ -31,6 +31,8 @@ enum class Command {
     Restart,
     Watch,
     Classes,
+    Serve,
+    Status,
     Completion
 };
 
@@ -60,6 +62,17 @@ struct WatchOptions {
     std::optional<double> timeout; ///< seconds
 };
 
+/** Where to serve and whom, over the server's own configuration. */
+struct ServerOptions {
+    std::string configurationFile;
+    bool trial = false;
+    std::optional<std::vector<std::string>> http; ///< ADDRESS:PORT, or "none"
+    std::optional<std::vector<std::string>> https;
+    std::optional<std::string> socket;  ///< a path, or "none"
+    std::vector<std::string> schema;    ///< directories of the site, besides what is shipped
+    std::vector<std::string> providers; ///< the same
+};
+
 struct Options {
     Command command = Command::Adapters;
     std::string argument; ///< a class, a path, an adapter or a shell
@@ -76,6 +89,7 @@ struct Options {
     bool json = false;
     bool namesOnly = false;
     WatchOptions watch;
+    ServerOptions server;
     AgentOptions agent;
     DirectoryOptions directories;
 };

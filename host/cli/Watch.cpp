@@ -2,6 +2,7 @@
 
 #include "host/cli/Json.h"
 #include "host/cli/WatchLine.h"
+#include "host/server/Signals.h"
 
 #include <algorithm>
 #include <array>
@@ -10,6 +11,7 @@
 #include <csignal>
 #include <cstdint>
 #include <deque>
+#include <initializer_list>
 #include <mutex>
 #include <optional>
 #include <system_error>
@@ -17,7 +19,6 @@
 
 #include <poll.h>
 #include <sys/eventfd.h>
-#include <sys/signalfd.h>
 #include <unistd.h>
 
 namespace marlo::cli {
@@ -44,46 +45,6 @@ class Descriptor {
 
   private:
     int _fd;
-};
-
-/** SIGINT and SIGTERM, read instead of acted upon while this lives; threads that start meanwhile leave them alone. */
-class EndSignals {
-  public:
-    EndSignals() : _signals(makeSet()), _before(block(_signals)), _descriptor(::signalfd(-1, &_signals, flags)) {}
-
-    ~EndSignals() { ::pthread_sigmask(SIG_SETMASK, &_before, nullptr); }
-
-    EndSignals(const EndSignals&) = delete;
-    EndSignals& operator=(const EndSignals&) = delete;
-
-    [[nodiscard]] int descriptor() const { return _descriptor.get(); }
-
-    /** Takes the signal that has come, lest it act when signals act again. */
-    void take() const {
-        signalfd_siginfo info{};
-        [[maybe_unused]] const auto size = ::read(descriptor(), &info, sizeof info);
-    }
-
-  private:
-    static constexpr int flags = SFD_CLOEXEC | SFD_NONBLOCK;
-
-    static sigset_t makeSet() {
-        sigset_t set;
-        sigemptyset(&set);
-        sigaddset(&set, SIGINT);
-        sigaddset(&set, SIGTERM);
-        return set;
-    }
-
-    static sigset_t block(const sigset_t& signals) {
-        sigset_t before;
-        ::pthread_sigmask(SIG_BLOCK, &signals, &before);
-        return before;
-    }
-
-    sigset_t _signals;
-    sigset_t _before;
-    Descriptor _descriptor;
 };
 
 /** Indications between the threads that deliver them and the one that prints them. */
@@ -138,7 +99,7 @@ class Watcher {
     }
 
     /** Prints until it is over; true when as many as were asked for have come. */
-    bool watch(const EndSignals& signals) {
+    bool watch(const server::Signals& signals) {
         const auto end = Clock::now() + std::chrono::duration_cast<Clock::duration>(
                                             std::chrono::duration<double>(_options.watch.timeout.value_or(0)));
         while (!isComplete()) {
@@ -149,7 +110,7 @@ class Watcher {
             print();
             const bool signalled = polled[0].revents != 0;
             if (signalled) {
-                signals.take();
+                static_cast<void>(signals.take()); // lest it act when signals act again
             }
             if (polled[2].revents != 0) {
                 throw OutputError(EPIPE);
@@ -231,7 +192,7 @@ std::vector<std::string> filtersOf(const Schema& schema, const Options& options)
 } // namespace
 
 ExitCode runWatch(ObjectManager& manager, const Options& options, Output& output) {
-    std::optional<EndSignals> signals(std::in_place);
+    std::optional<server::Signals> signals(std::in_place, std::initializer_list<int>{SIGINT, SIGTERM});
     Watcher watcher(manager, options, output);
     const std::vector<std::string> filters = filtersOf(manager.schema(), options);
     for (const std::string& filter : filters) {

@@ -2,6 +2,8 @@
 #include "host/cli/Environment.h"
 #include "host/cli/Options.h"
 #include "host/cli/Output.h"
+#include "host/cli/Serve.h"
+#include "host/cli/Status.h"
 
 #include <exception>
 
@@ -17,7 +19,13 @@ ExitCode runCommandLine(int argc, const char* const* argv) {
         output.finish();
         return Answered;
     }
+    if (line.options.command == Command::Status) {
+        return runStatus(line.options, output);
+    }
     tellAgent(line.options.agent);
+    if (line.options.command == Command::Serve) {
+        return runServe(line.options, output);
+    }
     marlo::ObjectManager manager(findDirectories(line.options.directories));
     return run(manager, line.options, output);
 }

@@ -91,6 +91,8 @@ struct Limits {
     std::chrono::milliseconds idleTime{60000};    ///< between two requests
     std::chrono::milliseconds sendTime{30000};    ///< for a client to take the next piece of an answer
     std::chrono::milliseconds lingerTime{5000};   ///< for a client that still sends to see the last answer
+
+    bool operator==(const Limits&) const = default;
 };
 
 /** A TLS identity and whom to trust; PEM files. */

@@ -1,0 +1,48 @@
+/**
+ * @file
+ * How a running server is, as it tells those who ask (GET /status) and as it is shown.
+ */
+#pragma once
+
+#include "host/http/Server.h"
+#include "host/server/Statistics.h"
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace marlo::server {
+
+struct ProviderState {
+    std::string name;
+    std::string library;
+    std::string state;   ///< "idle" before its first request, "loaded", "failed"
+    std::string failure; ///< the latest reason why it could not be loaded
+};
+
+struct StatusReport {
+    std::string version;
+    std::uint64_t process = 0;
+    std::uint64_t uptimeSeconds = 0;
+    std::string configuration;          ///< the file that is in force; empty: none
+    std::vector<std::string> reasons;   ///< why its health is degraded; none: it is well
+    std::vector<std::string> listeners; ///< "http 127.0.0.1:5988", "local /run/marlo/marlo.sock"
+    http::Counters counters;
+    std::vector<RequestCount> requests;
+    Latency latency;
+    std::uint64_t openEnumerations = 0;
+    std::vector<ProviderState> providers;
+    std::uint64_t residentBytes = 0;
+    std::uint64_t lostLogLines = 0;
+};
+
+/** One JSON object, on one line. */
+std::string toJson(const StatusReport& report);
+
+/** What toJson wrote; throws std::invalid_argument for anything else. */
+StatusReport parseStatusReport(const std::string& json);
+
+/** Of this process (proc(5), statm); 0 where that cannot be read. */
+std::uint64_t residentBytes();
+
+} // namespace marlo::server

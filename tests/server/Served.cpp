@@ -1,0 +1,121 @@
+#include "tests/server/Served.h"
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <thread>
+
+namespace marlo::test {
+
+namespace {
+
+std::string readFile(const std::string& file) {
+    std::ifstream stream(file);
+    return {std::istreambuf_iterator<char>(stream), {}};
+}
+
+/** What follows `label` on its line. */
+std::string lineOf(const std::string& text, const std::string& label) {
+    const std::size_t begin = text.find(label);
+    if (begin == std::string::npos) {
+        return "";
+    }
+    const std::size_t value = begin + label.size();
+    return text.substr(value, text.find('\n', value) - value);
+}
+
+} // namespace
+
+ServedTest::ServedTest() {
+    _tables["listen"] = "http = [\"127.0.0.1:0\"]\nhttps = [\"127.0.0.1:0\"]\nsocket = \"marlo.sock\"\n";
+    _tables["directories"] = "state = \"state\"\n";
+    _tables["log"] = "sink = \"file:server.log\"\nlevel = \"debug\"\n";
+    _arguments = {MARLO_EXECUTABLE, "serve", "--trial", "--config", path("server.toml")};
+    _environment = {{"ORV_AGENT_TREE", tree()}, {"LC_ALL", "C"}};
+}
+
+ServedTest::~ServedTest() {
+    if (HasFailure()) {
+        std::cerr << "the server said:\n" << _said << readFile(path("server.err")) << "its log:\n" << log();
+    }
+}
+
+void ServedTest::writeConfiguration() const {
+    std::string text;
+    for (const auto& [name, table] : _tables) {
+        text += "[" + name + "]\n" + table;
+    }
+    write("server.toml", text);
+}
+
+void ServedTest::serveFixture() {
+    for (const char* name : {"schema", "providers"}) {
+        configure("directories", std::string(name) + " = [\"site/" + name + "\"]\n");
+    }
+}
+
+void ServedTest::start() {
+    writeConfiguration();
+    _server = std::make_unique<Process>(_arguments, _environment, directory(), path("server.err"), _prepare);
+    _said = _server->readUntil("serving");
+    ASSERT_NE(_said.find("serving"), std::string::npos) << _said << readFile(path("server.err"));
+    _password = lineOf(_said, "\npassword: ");
+}
+
+int ServedTest::stop() {
+    _server->signal(SIGTERM);
+    return _server->wait(Patience);
+}
+
+std::string ServedTest::log() const {
+    return readFile(path("server.log"));
+}
+
+std::string ServedTest::logWith(const std::string& text) const {
+    const auto end = std::chrono::steady_clock::now() + Patience;
+    std::string lines = log();
+    while (lines.find(text) == std::string::npos && std::chrono::steady_clock::now() < end) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        lines = log();
+    }
+    EXPECT_NE(lines.find(text), std::string::npos) << "never logged: " << text;
+    return lines;
+}
+
+unsigned short ServedTest::port(const std::string& scheme) const {
+    const std::string address = lineOf(_said, "listening: " + scheme + " 127.0.0.1:");
+    return static_cast<unsigned short>(std::stoul("0" + address));
+}
+
+std::string ServedTest::url(const std::string& scheme, const std::string& rest) const {
+    return scheme + "://marlo:" + _password + "@127.0.0.1:" + std::to_string(port(scheme)) + "/" + rest;
+}
+
+Outcome ServedTest::wbemcli(std::vector<std::string> arguments) const {
+    arguments.insert(arguments.begin(), {"timeout", "60", "wbemcli"});
+    return runProgram(arguments, {}, "", directory());
+}
+
+Outcome ServedTest::curl(std::vector<std::string> arguments) const {
+    arguments.insert(arguments.begin(), {"curl", "-sS", "--max-time", "60"});
+    return runProgram(arguments, {}, "", directory());
+}
+
+std::string intrinsic(const std::string& method, const std::string& nameSpace, const std::string& parameters) {
+    std::string path;
+    std::istringstream parts(nameSpace);
+    for (std::string part; std::getline(parts, part, '/');) {
+        path += "<NAMESPACE NAME=\"" + part + "\"/>";
+    }
+    return R"(<?xml version="1.0" encoding="utf-8"?><CIM CIMVERSION="2.0" DTDVERSION="2.0"><MESSAGE ID="7" )"
+           R"(PROTOCOLVERSION="1.0"><SIMPLEREQ><IMETHODCALL NAME=")" +
+           method + "\"><LOCALNAMESPACEPATH>" + path + "</LOCALNAMESPACEPATH>" + parameters +
+           "</IMETHODCALL></SIMPLEREQ></MESSAGE></CIM>";
+}
+
+std::string classParameter(const std::string& className) {
+    return R"(<IPARAMVALUE NAME="ClassName"><CLASSNAME NAME=")" + className + R"("/></IPARAMVALUE>)";
+}
+
+} // namespace marlo::test
