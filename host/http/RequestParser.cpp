@@ -184,14 +184,17 @@ std::size_t RequestParser::readBody(std::string_view bytes, std::string& body, s
     _beast->limit = limit;
     std::size_t used = 0;
     while (!_beast->is_done() && used < bytes.size()) {
+        const std::size_t before = body.size();
         error_code code;
-        const std::size_t step =
-            _beast->put(boost::asio::const_buffer(bytes.data() + used, bytes.size() - used), code);
+        const auto rest = bytes.substr(used);
+        const std::size_t step = _beast->put(boost::asio::const_buffer(rest.data(), rest.size()), code);
         used += step;
-        if (code == error::need_more) {
-            if (bytes.size() - used > _headBytes) {
-                throw Fault(431, "the head of a chunk, or the trailers, are too long");
-            }
+        const bool isMissing = code == error::need_more;
+        const std::size_t frame = isMissing ? rest.size() - step + 1 : step - (body.size() - before);
+        if (frame > _headBytes) {
+            throw Fault(431, "the head of a chunk, or the trailers, are too long");
+        }
+        if (isMissing) {
             break;
         }
         if (code) {
