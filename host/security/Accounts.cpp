@@ -47,6 +47,9 @@ std::optional<Account> findPasswd(const std::string& what, const Look& lookUp) {
 } // namespace
 
 std::optional<Account> findAccount(const std::string& name) {
+    if (name.find('\0') != std::string::npos) {
+        return std::nullopt; // else what is before it would be looked up
+    }
     return findPasswd("user \"" + name + "\"", [&](passwd* record, char* buffer, std::size_t size, passwd** found) {
         return getpwnam_r(name.c_str(), record, buffer, size, found);
     });

@@ -54,6 +54,12 @@ TEST(Access, OfEveryoneNeedsAnAccount) {
     EXPECT_EQ(rolesOf({{"*"}, {}, {}}, ""), ":");
 }
 
+TEST(Access, IsForWholeNamesOnly) {
+    EXPECT_EQ(rolesOf({{"*"}, {}, {}}, std::string("root\0x", 6)), ":");
+    EXPECT_EQ(rolesOf({{"*"}, {}, {}}, "root "), ":");
+    EXPECT_EQ(rolesOf({{"*"}, {}, {}}, "0"), ":");
+}
+
 TEST(Access, OfNobodyIsWhatThereIsWithoutNames) {
     EXPECT_EQ(rolesOf({}, "root"), ":");
 }
