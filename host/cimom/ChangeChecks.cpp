@@ -140,7 +140,9 @@ std::optional<Value> convertValue(const Value& value, CMPIType type) {
         return Value::null(type);
     }
     if ((type & CMPI_ARRAY) == 0) {
-        return value.isArray() ? std::nullopt : convertKey(value, type);
+        // Embedded instances are texts to the schema, and CMPI has them as instances.
+        const bool isEmbedded = type == CMPI_string && value.type == CMPI_instance;
+        return value.isArray() ? std::nullopt : isEmbedded ? value : convertKey(value, type);
     }
     const auto* given = std::get_if<Value::Array>(&value.data);
     if (given == nullptr) {

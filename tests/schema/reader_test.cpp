@@ -132,6 +132,21 @@ TEST_F(SchemaReader, RefusesADirectoryThatIsMissingOrHasNoMof) {
     }
 }
 
+TEST_F(SchemaReader, ReadsDirectoriesOneAfterTheOtherIntoOneSchema) {
+    write("first/z.mof", "#pragma namespace (\"root/one\")\nclass A {};");
+    write("second/a.mof", "class Everywhere {};\n#pragma namespace (\"root/one\")\nclass B : A {};\n"
+                          "#pragma namespace (\"root/two\")\nclass C : Everywhere {};");
+    std::filesystem::create_directory(path("empty"));
+    const Schema schema = Schema::readDirectories({path("first"), path("empty"), path("second")});
+    EXPECT_THAT(schema.nameSpaces(), ElementsAre("root/one", "root/two"));
+    EXPECT_TRUE(schema.isA("root/one", "B", "A"));
+    EXPECT_NE(schema.findClass("root/two", "Everywhere"), nullptr);
+    EXPECT_EQ(*schema.findNameSpace("ROOT/One"), "root/one");
+    EXPECT_EQ(schema.findNameSpace("root/three"), nullptr);
+    EXPECT_THROW(Schema::readDirectories({path("empty")}), std::runtime_error);
+    EXPECT_THROW(Schema::readDirectories({path("first"), path("none")}), std::runtime_error);
+}
+
 TEST_F(SchemaReader, RefusesAFileThatIsADirectory) {
     write("a.mof/inside", "");
     EXPECT_EQ(error(), "cannot read " + path("a.mof") + ": Is a directory");
