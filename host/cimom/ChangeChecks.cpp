@@ -128,6 +128,12 @@ std::optional<Value> initialValue(const Property& property, const std::vector<Na
     return property.defaultValue.isNull() ? std::nullopt : std::optional(property.defaultValue);
 }
 
+/** The schema has no type for embedded instances but string, with a qualifier, which is not looked at. */
+bool isEmbedded(const Value& value, CMPIType type) {
+    return (type & ~CMPI_ARRAY) == CMPI_string && (value.type & ~CMPI_ARRAY) == CMPI_instance &&
+           (type & CMPI_ARRAY) == (value.type & CMPI_ARRAY);
+}
+
 } // namespace
 
 std::string fullTypeName(CMPIType type) {
@@ -138,6 +144,9 @@ std::string fullTypeName(CMPIType type) {
 std::optional<Value> convertValue(const Value& value, CMPIType type) {
     if (value.isNull()) {
         return Value::null(type);
+    }
+    if (isEmbedded(value, type)) {
+        return value;
     }
     if ((type & CMPI_ARRAY) == 0) {
         // Embedded instances are texts to the schema, and CMPI has them as instances.

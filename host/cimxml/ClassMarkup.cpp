@@ -23,21 +23,14 @@ void appendFlavors(std::string& out, const T& qualifier) {
     appendFlag(out, "TRANSLATABLE", qualifier.translatable, false);
 }
 
-/** A feature is inherited as it is when nothing of it is of the class itself. */
-bool isPropagated(const std::string& origin, const Qualifiers& qualifiers, const Class& definition) {
-    return !origin.empty() && !equalNames(origin, definition.name) &&
-           std::all_of(qualifiers.begin(), qualifiers.end(), [](const Qualifier& one) { return one.propagated; });
-}
-
-void appendOrigin(std::string& out, const std::string& origin, const Qualifiers& qualifiers, const Class& definition,
-                  const Form& form) {
+void appendOrigin(std::string& out, const std::string& origin, bool isPropagated, const Form& form) {
     if (form.classOrigin && !origin.empty()) {
         appendAttribute(out, "CLASSORIGIN", origin);
     }
-    appendFlag(out, "PROPAGATED", isPropagated(origin, qualifiers, definition), false);
+    appendFlag(out, "PROPAGATED", isPropagated, false);
 }
 
-void appendProperty(std::string& out, const Property& property, const Class& definition, const Form& form) {
+void appendProperty(std::string& out, const Property& property, const Form& form) {
     const bool isReference = property.type == CMPI_ref;
     const std::string_view element = isReference                         ? "PROPERTY.REFERENCE"
                                      : (property.type & CMPI_ARRAY) != 0 ? "PROPERTY.ARRAY"
@@ -50,7 +43,7 @@ void appendProperty(std::string& out, const Property& property, const Class& def
     } else if (!property.referenceClass.empty()) {
         appendAttribute(out, "REFERENCECLASS", property.referenceClass);
     }
-    appendOrigin(out, property.origin, property.qualifiers, definition, form);
+    appendOrigin(out, property.origin, property.propagated, form);
     out += '>';
     if (form.qualifiers) {
         appendQualifiers(out, property.qualifiers);
@@ -88,13 +81,13 @@ void appendParameter(std::string& out, const Parameter& parameter, const Form& f
     out += '>';
 }
 
-void appendMethod(std::string& out, const Method& method, const Class& definition, const Form& form) {
+void appendMethod(std::string& out, const Method& method, const Form& form) {
     out += "<METHOD";
     appendAttribute(out, "NAME", method.name);
     if (method.returnType != CMPI_null) {
         appendAttribute(out, "TYPE", typeAttribute(method.returnType));
     }
-    appendOrigin(out, method.origin, method.qualifiers, definition, form);
+    appendOrigin(out, method.origin, method.propagated, form);
     out += '>';
     if (form.qualifiers) {
         appendQualifiers(out, method.qualifiers);
@@ -142,10 +135,10 @@ void appendClass(std::string& out, const Class& definition, const Form& form) {
         appendQualifiers(out, definition.qualifiers);
     }
     for (const Property& property : definition.properties) {
-        appendProperty(out, property, definition, form);
+        appendProperty(out, property, form);
     }
     for (const Method& method : definition.methods) {
-        appendMethod(out, method, definition, form);
+        appendMethod(out, method, form);
     }
     out += "</CLASS>";
 }

@@ -52,6 +52,8 @@ void Reply::write(std::string_view piece) {
 void Reply::finish() {
     require(_stage == Stage::gathering || _stage == Stage::streaming);
     if (_stage == Stage::gathering) {
+        // With its length known, an answer is not chunked and has no trailers to announce.
+        std::erase_if(_fields, [](const Field& field) { return field.name == "Trailer"; });
         sendWhole(_status, _fields, _gathered);
         return;
     }

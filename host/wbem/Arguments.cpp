@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
 
 namespace marlo::wbem {
 
@@ -39,7 +40,9 @@ std::string_view plainNameSpace(std::string_view text) {
 
 } // namespace
 
-Arguments::Arguments(const cimxml::IntrinsicCall& call, std::string_view parameters) : _call(call) {
+Arguments::Arguments(const cimxml::IntrinsicCall& call, std::string_view parameters, const Schema& schema,
+                     std::string nameSpace)
+    : _call(call), _schema(schema), _nameSpace(std::move(nameSpace)) {
     for (auto argument = call.arguments.begin(); argument != call.arguments.end(); ++argument) {
         if (!isListed(parameters, argument->name)) {
             refuse(call.method + " has no parameter '" + argument->name + "'");
@@ -150,8 +153,9 @@ ObjectPath Arguments::local(std::string_view name, ObjectPath path) const {
         refuse("the parameter " + std::string(name) + " of " + _call.method + " is of the namespace " +
                path.nameSpace + ", but the call of " + _call.nameSpace);
     }
-    path.nameSpace = _call.nameSpace;
+    path.nameSpace = _nameSpace;
     path.host.clear();
+    nameLoneKey(_schema, path);
     return path;
 }
 
@@ -165,7 +169,7 @@ ObjectPath Arguments::instanceName(std::string_view name) const {
 
 ObjectPath Arguments::objectName(std::string_view name) const {
     if (const auto* className = std::get_if<cimxml::ClassName>(&require(name))) {
-        return {"", _call.nameSpace, className->name, {}};
+        return {"", _nameSpace, className->name, {}};
     }
     return instanceName(name);
 }
@@ -176,6 +180,17 @@ Instance Arguments::instance(std::string_view name) const {
         refuseType(_call, name, "an instance");
     }
     return {local(name, instance->path), instance->properties};
+}
+
+void nameLoneKey(const Schema& schema, ObjectPath& path) {
+    if (path.keys.size() != 1 || !path.keys[0].name.empty()) {
+        return;
+    }
+    const Class* definition = schema.findClass(path.nameSpace, path.className);
+    const auto keys = definition == nullptr ? std::vector<const Property*>() : definition->keys();
+    if (keys.size() == 1) {
+        path.keys[0].name = keys[0]->name;
+    }
 }
 
 std::string subjectOf(const cimxml::IntrinsicCall& call) {

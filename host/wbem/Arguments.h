@@ -20,9 +20,12 @@ namespace marlo::wbem {
  */
 class Arguments {
   public:
-    /** `parameters` are the names that the method has, separated by spaces. Throws for others and for doubled ones.
+    /**
+     * `parameters` are the names that the method has, separated by spaces. Throws for others and for doubled ones.
+     * `nameSpace` is that of the call as the schema spells it.
      */
-    Arguments(const cimxml::IntrinsicCall& call, std::string_view parameters);
+    Arguments(const cimxml::IntrinsicCall& call, std::string_view parameters, const Schema& schema,
+              std::string nameSpace);
 
     [[nodiscard]] bool has(std::string_view name) const { return find(name) != nullptr; }
 
@@ -53,7 +56,12 @@ class Arguments {
     [[nodiscard]] ObjectPath local(std::string_view name, ObjectPath path) const;
 
     const cimxml::IntrinsicCall& _call;
+    const Schema& _schema;
+    std::string _nameSpace;
 };
+
+/** Gives a key without a name, as DSP0201 allows it where there is one alone, the name that the schema has for it. */
+void nameLoneKey(const Schema& schema, ObjectPath& path);
 
 /** The class that a call is about, as far as its arguments name one, else empty; of calls that may be wrong, too. */
 std::string subjectOf(const cimxml::IntrinsicCall& call);

@@ -24,11 +24,13 @@ AssociationFilter readReferenceFilter(const Arguments& arguments) {
     return {arguments.optionalClassName("ResultClass"), "", arguments.optionalText("Role"), ""};
 }
 
-/** Classes that are named must be there, of an object as of a filter. */
+/** Classes that are named must be there: that of an object, and those of a filter, which are but parameters. */
 void requireClasses(const Call& call, const ObjectPath& object, const AssociationFilter& filter) {
-    for (const std::string& name : {object.className, filter.associationClass, filter.resultClass}) {
-        if (!name.empty()) {
-            requireClass(call.manager.schema(), call.nameSpace, name);
+    requireClass(call.manager.schema(), call.nameSpace, object.className);
+    for (const std::string& name : {filter.associationClass, filter.resultClass}) {
+        if (!name.empty() && call.manager.schema().findClass(call.nameSpace, name) == nullptr) {
+            throw RequestError(CMPI_RC_ERR_INVALID_PARAMETER,
+                               "there is no class '" + name + "' in " + call.nameSpace);
         }
     }
 }

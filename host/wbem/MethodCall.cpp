@@ -1,6 +1,7 @@
 #include "host/wbem/MethodCall.h"
 
 #include "host/cimom/ChangeChecks.h"
+#include "host/wbem/Arguments.h"
 
 #include <algorithm>
 
@@ -27,15 +28,17 @@ NamedValue readNamed(const Method& method, const cimxml::NamedArgument& argument
 } // namespace
 
 Status callMethod(ObjectManager& manager, const cimxml::ExtrinsicCall& call, Reply& reply) {
-    const Class& definition =
-        requireClass(manager.schema(), manager.spell(call.path.nameSpace), call.path.className);
+    ObjectPath path = call.path;
+    path.nameSpace = manager.spell(path.nameSpace);
+    const Class& definition = requireClass(manager.schema(), path.nameSpace, path.className);
+    nameLoneKey(manager.schema(), path);
     const Method& method = requireMethod(definition, call.method);
     std::vector<NamedValue> arguments;
     for (const cimxml::NamedArgument& argument : call.arguments) {
         arguments.push_back(readNamed(method, argument));
     }
     MethodAnswer answer;
-    Status status = manager.invokeMethod(call.path, call.method, arguments, answer);
+    Status status = manager.invokeMethod(path, call.method, arguments, answer);
     if (status.ok()) {
         cimxml::Writer& writer = reply.behind();
         writer.returnValue(answer.returned);

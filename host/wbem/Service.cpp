@@ -126,7 +126,7 @@ Status Service::State::callIntrinsic(const cimxml::IntrinsicCall& call, const se
     if (operation == nullptr) {
         return {CMPI_RC_ERR_NOT_SUPPORTED, "there is no operation '" + call.method + "'", {}};
     }
-    const Arguments arguments(call, operation->parameters());
+    const Arguments arguments(call, operation->parameters(), manager.schema(), nameSpace);
     Call context{manager, enumerations, options.limits, identity, nameSpace, arguments, reply};
     return operation->run()(context);
 }

@@ -210,9 +210,9 @@ TEST(WrittenInstance, SaysObjectWhereAnyClassMayBeEmbedded) {
 TEST(WrittenClass, SaysWhatIsInherited) {
     Class definition = exampleClass();
     definition.properties.resize(2);
-    definition.methods.push_back({"Do", CMPI_uint32, {}, {}, "A"});
+    definition.properties[0].propagated = true;
+    definition.methods.push_back({"Do", CMPI_uint32, {}, {}, "A", true});
     definition.properties.push_back(property("Overridden", CMPI_string, "A"));
-    definition.properties.back().qualifiers.push_back({"Override", Value::string("Overridden")});
     EXPECT_EQ(
         written([&](Writer& writer) { writer.classDefinition(definition, {}); }),
         "<CLASS NAME=\"B\" SUPERCLASS=\"A\"><PROPERTY NAME=\"Key\" TYPE=\"string\" PROPAGATED=\"true\"></PROPERTY>"

@@ -22,7 +22,8 @@ constexpr std::string_view headEnd = "\r\n\r\n";
 constexpr std::string_view lastChunk = "0\r\n\r\n";
 
 std::string lower(std::string text) {
-    std::transform(text.begin(), text.end(), text.begin(), [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
     return text;
 }
 
@@ -71,22 +72,18 @@ bool receive(int descriptor, std::string& received) {
     return count > 0;
 }
 
-/** One final answer, and the interim ones before it; what came of it where the connection ended. */
-std::string receiveAnswer(int descriptor, bool isHead, std::string& received) {
-    std::string answer;
+/** One answer, interim or final; what came of it where the connection ended. */
+std::string receiveOne(int descriptor, bool isHead, std::string& received) {
     while (true) {
-        const bool isInterim = received.starts_with("HTTP/1.1 1");
-        const auto end = endOfMessage(received, !isInterim && !isHead);
-        if (end == std::string::npos) {
-            if (!receive(descriptor, received)) {
-                return answer + std::exchange(received, {});
-            }
-            continue;
-        }
-        answer += received.substr(0, end);
-        received.erase(0, end);
-        if (!isInterim) {
+        const bool hasBody = !isHead && !received.starts_with("HTTP/1.1 1");
+        const auto end = endOfMessage(received, hasBody);
+        if (end != std::string::npos) {
+            std::string answer = received.substr(0, end);
+            received.erase(0, end);
             return answer;
+        }
+        if (!receive(descriptor, received)) {
+            return std::exchange(received, {});
         }
     }
 }
@@ -99,6 +96,22 @@ void sendAll(int descriptor, const std::string& bytes) {
         }
         sent += static_cast<std::size_t>(count);
     }
+}
+
+/** The answer to a request. One that waits to be continued sends its body only then. */
+std::string sendAndReceive(int descriptor, const std::string& request, std::string& received) {
+    const std::size_t body = request.find(headEnd) + headEnd.size();
+    const bool waits = fieldOf(request.substr(0, body), "expect").has_value();
+    std::string interim;
+    if (waits) {
+        sendAll(descriptor, request.substr(0, body));
+        interim = receiveOne(descriptor, false, received);
+    }
+    if (waits && !interim.starts_with("HTTP/1.1 1")) {
+        return interim;
+    }
+    sendAll(descriptor, waits ? request.substr(body) : request);
+    return interim + receiveOne(descriptor, request.starts_with("HEAD "), received);
 }
 
 void replaceAll(std::string& text, const std::string& what, const std::string& by) {
@@ -162,8 +175,7 @@ std::string exchange(int descriptor, const std::string& requests) {
         if (!context.empty()) {
             replaceAll(request, contextPlaceholder, context);
         }
-        sendAll(descriptor, request);
-        answers += normalised(receiveAnswer(descriptor, request.starts_with("HEAD "), received), context);
+        answers += normalised(sendAndReceive(descriptor, request, received), context);
     }
     return answers;
 }

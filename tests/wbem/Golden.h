@@ -3,8 +3,8 @@
  * Requests in files and the answers that they get, byte by byte.
  *
  * `golden/NAME.request` holds what a client sends: one request or, on one connection, several. `golden/NAME.response`
- * holds all that it gets. What differs from run to run is replaced: the Date of an answer, and contexts of enumerations,
- * for which `contextPlaceholder` stands, in a request for the last one that an answer gave.
+ * holds all that it gets. What differs from run to run is replaced: the Date of an answer, and contexts of
+ * enumerations, for which `contextPlaceholder` stands, in a request for the last one that an answer gave.
  */
 #pragma once
 

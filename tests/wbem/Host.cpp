@@ -4,6 +4,8 @@
 #include <fstream>
 #include <stdexcept>
 
+#include <gtest/gtest.h>
+
 namespace marlo::test {
 
 namespace {
@@ -55,7 +57,7 @@ class TEST_Typed : TEST_Base {
 class TEST_Throwing { [Key] string Id; };
 class TEST_Refusing { [Key] string Id; };
 class TEST_Partial { [Key] string Id; };
-class TEST_Empty { [Key] string Id; };
+class TEST_Empty { [Key] string Id; uint32 Grow(); };
 )";
 
 std::filesystem::path makeDirectory() {
@@ -74,6 +76,23 @@ void write(const std::filesystem::path& file, const std::string& text) {
 std::string backwards(const std::string& text) {
     return {text.rbegin(), text.rend()};
 }
+
+/** The agent of a process reads one description, from the same place for all hosts that there are in turn. */
+const std::filesystem::path& treeFile() {
+    static const std::filesystem::path directory = makeDirectory();
+    static const std::filesystem::path file = directory / "host.toml";
+    return file;
+}
+
+class RemoveTree : public testing::Environment {
+  public:
+    void TearDown() override {
+        std::error_code ignored;
+        std::filesystem::remove_all(treeFile().parent_path(), ignored);
+    }
+};
+
+const auto* const removal = testing::AddGlobalTestEnvironment(new RemoveTree); // NOLINT(cert-err58-cpp)
 
 class BackwardsCheck final : public security::PasswordCheck {
   public:
@@ -112,12 +131,13 @@ std::string base64(const std::string& text) {
 } // namespace
 
 Host::Host(const wbem::Limits& limits, std::vector<wbem::Route> routes) : _directory(makeDirectory()) {
-    write(_directory / "host.toml", tree);
+    write(treeFile(), tree);
     setenv("ORV_AGENT_BACKEND", "file", 1);
-    setenv("ORV_AGENT_TREE", (_directory / "host.toml").c_str(), 1);
+    setenv("ORV_AGENT_TREE", treeFile().c_str(), 1);
     write(_directory / "schema/test.mof", std::string(fixtureMof) + itemsMof);
     write(_directory / "providers/fixture.toml",
-          "library = \"" MARLO_FIXTURE_PROVIDER "\"\n[[provider]]\nname = \"FixtureProvider\"\nkinds = [\"instance\"]\n"
+          "library = \"" MARLO_FIXTURE_PROVIDER
+          "\"\n[[provider]]\nname = \"FixtureProvider\"\nkinds = [\"instance\"]\n"
           "namespaces = [\"root/test\"]\nclasses = [\"TEST_Typed\", \"TEST_Throwing\", \"TEST_Refusing\", "
           "\"TEST_Partial\", \"TEST_Empty\"]\n");
     ObjectManagerOptions options;
@@ -127,8 +147,7 @@ Host::Host(const wbem::Limits& limits, std::vector<wbem::Route> routes) : _direc
     options.log = [](const std::string& /*line*/) {};
     _manager = std::make_unique<ObjectManager>(options);
     _manager->add(_items);
-    _gatekeeper =
-        std::make_unique<security::Gatekeeper>(gatekeeperOptions(), [](const std::string& /*line*/) {});
+    _gatekeeper = std::make_unique<security::Gatekeeper>(gatekeeperOptions(), [](const std::string& /*line*/) {});
     wbem::ServiceOptions service;
     service.admit = [this](const http::RequestHead& head, const http::Peer& peer) {
         return _gatekeeper->admit(head, peer);

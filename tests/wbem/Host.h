@@ -1,7 +1,7 @@
 /**
  * @file
- * A described host, served: the real providers and those of the tests, behind the service, the gatekeeper and, where a
- * test wants it, the HTTP server.
+ * A described host, served: the real providers and those of the tests, behind the service, the gatekeeper and, where
+ * a test wants it, the HTTP server.
  */
 #pragma once
 

@@ -55,7 +55,8 @@ class TEST_Unserved { [Key] string Id; };
 namespace {
 
 ObjectPath pathOf(const std::string& className, const std::string& name, std::uint64_t number) {
-    return {"", "root/test", className, {{"Name", Value::string(name)}, {"Number", Value::uint(CMPI_uint16, number)}}};
+    return {
+        "", "root/test", className, {{"Name", Value::string(name)}, {"Number", Value::uint(CMPI_uint16, number)}}};
 }
 
 Instance makeItem(const std::string& className, const std::string& name, std::uint64_t number) {
@@ -136,6 +137,9 @@ Status Items::create(const Class& definition, const Instance& instance, ObjectPa
     if (definition.name != "TEST_Item") {
         return BuiltIn::create(definition, instance, created);
     }
+    if (instance.path.keys.size() < 2) {
+        return {CMPI_RC_ERR_INVALID_PARAMETER, "an item needs Name and Number", {}};
+    }
     const std::lock_guard lock(_mutex);
     const auto found = std::find_if(_items.begin(), _items.end(),
                                     [&](const Instance& item) { return item.path.keys == instance.path.keys; });
@@ -166,8 +170,7 @@ Status Items::modify(const Class& /*definition*/, const Instance& instance, cons
 
 Status Items::remove(const Class& /*definition*/, const ObjectPath& path) {
     const std::lock_guard lock(_mutex);
-    const auto removed =
-        std::erase_if(_items, [&path](const Instance& item) { return item.path.keys == path.keys; });
+    const auto removed = std::erase_if(_items, [&path](const Instance& item) { return item.path.keys == path.keys; });
     return removed == 0 ? notFound(path) : Status{};
 }
 

@@ -17,8 +17,8 @@ extern const char* const itemsMof;
 
 /**
  * TEST_Item and TEST_SubItem, two of the one and one of the other to begin with, and TEST_Link from the first item to
- * each of the others. TEST_Item.Echo gives back what it was given, Explode throws, Hello is static and names who asks.
- * TEST_Stream has as many instances as `streamLength` says, and calls `onStream` before each; at the one that
+ * each of the others. TEST_Item.Echo gives back what it was given, Explode throws, Hello is static and names who
+ * asks. TEST_Stream has as many instances as `streamLength` says, and calls `onStream` before each; at the one that
  * `streamFailsAt` names it fails.
  */
 class Items final : public BuiltIn {

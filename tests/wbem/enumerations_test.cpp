@@ -19,7 +19,8 @@ using wbem::Pulled;
 const EnumerationOwner alice{"alice", "root/test", Pulled::instancesWithPath};
 
 Instance makeInstance(const std::string& name, std::size_t size = 0) {
-    return {{"", "root/test", "C", {{"Name", Value::string(name)}}}, {{"Filling", Value::string(std::string(size, 'x'))}}};
+    return {{"", "root/test", "C", {{"Name", Value::string(name)}}},
+            {{"Filling", Value::string(std::string(size, 'x'))}}};
 }
 
 std::string open(Enumerations& enumerations, const EnumerationOwner& owner, int count,
@@ -86,7 +87,9 @@ TEST(Enumerations, AreTheirOwnersAlone) {
         EXPECT_EQ(refusal([&] { static_cast<void>(enumerations.pull(context, other, 1)); }),
                   wbem::invalidEnumerationContext);
     }
-    EXPECT_EQ(refusal([&] { enumerations.close(context, {"bob", "root/test", {}}); }),
+    EXPECT_EQ(refusal([&] {
+                  enumerations.close(context, {"bob", "root/test", {}});
+              }),
               wbem::invalidEnumerationContext);
     EXPECT_EQ(refusal([&] { enumerations.close(context, {"alice", "ROOT/test", Pulled::paths}); }), CMPI_RC_OK);
 }
