@@ -1,6 +1,7 @@
 /** @file Documents that were made to do harm, and the limits that they meet. */
 #include "tests/cimxml/Documents.h"
 
+#include <chrono>
 #include <random>
 #include <thread>
 
@@ -253,6 +254,17 @@ TEST_F(Hostile, NumberOfAttributesIsLimited) {
     EXPECT_FALSE(refusalOf(document(Limits().attributes)));
     expectRefusal(document(Limits().attributes + 1), Kind::notValid, "line 3, column 190: more than 16 attributes");
     expectRefusal(document(300000), Kind::notValid, "more than 16 attributes of an element");
+}
+
+TEST_F(Hostile, NothingIsReadBehindWhatIsNotWellFormed) {
+    // Read on, the parser would compare each of these attributes with each, for minutes.
+    std::string attributes;
+    for (std::size_t i = 0; i < 300000; ++i) {
+        attributes += " a" + std::to_string(i) + "=''";
+    }
+    const auto start = std::chrono::steady_clock::now();
+    expectRefusal("<CIM><? <x" + attributes + "/> ?></CIM>", Kind::notWellFormed, "line 1, column 8: xmlParsePI");
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(20));
 }
 
 TEST_F(Hostile, AttributesAreCountedInTagsOnly) {
