@@ -295,8 +295,8 @@ class PathReader {
         if (result.ec != std::errc() || result.ptr != end) {
             fail(start, "a number, found '" + std::string(text) + "'");
         }
-        return negative ? Value::sint(CMPI_sint64, static_cast<std::int64_t>(-magnitude))
-                        : Value::uint(CMPI_uint64, magnitude);
+        return negative && magnitude != 0 ? Value::sint(CMPI_sint64, static_cast<std::int64_t>(-magnitude))
+                                          : Value::uint(CMPI_uint64, magnitude);
     }
 
     Value readBoolean() {

@@ -65,6 +65,7 @@ INSTANTIATE_TEST_SUITE_P(
                     Reading{"C.K=0x1F", {"", "", "C", {{"K", Value::uint(CMPI_uint64, 31)}}}},
                     Reading{"C.K=+7", {"", "", "C", {{"K", Value::uint(CMPI_uint64, 7)}}}},
                     Reading{"C.K=18446744073709551615", {"", "", "C", {{"K", Value::uint(CMPI_uint64, ~0ULL)}}}},
+                    Reading{"C.K=-0", {"", "", "C", {{"K", Value::uint(CMPI_uint64, 0)}}}},
                     Reading{"C.K=-9223372036854775808", {"", "", "C", {{"K", Value::sint(CMPI_sint64, INT64_MIN)}}}},
                     Reading{"C.K=false", {"", "", "C", {{"K", Value::boolean(false)}}}},
                     Reading{"C.K='\\x20AC'", {"", "", "C", {{"K", {CMPI_char16, u'\u20ac'}}}}},
