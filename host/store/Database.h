@@ -43,14 +43,27 @@ struct Blob {
     std::string_view bytes;
 };
 
+struct Finalize {
+    void operator()(sqlite3_stmt* statement) const;
+};
+
+struct TextHash {
+    using is_transparent = void;
+
+    std::size_t operator()(std::string_view text) const { return std::hash<std::string_view>()(text); }
+};
+
+/** Prepared statements that nobody uses, by their text. */
+using Cache = std::unordered_map<std::string, std::unique_ptr<sqlite3_stmt, Finalize>, TextHash, std::equal_to<>>;
+
+class Database;
+
 /**
  * The rows of one statement. It uses a prepared statement of the database's cache, and gives it back when it ends; it
  * must not outlive the database. Columns are counted from 0; views are good until the next row.
  */
 class Rows {
   public:
-    Rows(Rows&& other) noexcept;
-    Rows& operator=(Rows&&) = delete;
     Rows(const Rows&) = delete;
     Rows& operator=(const Rows&) = delete;
     ~Rows();
@@ -63,18 +76,32 @@ class Rows {
     [[nodiscard]] std::string text(int column) const;     ///< empty for NULL
     [[nodiscard]] std::string_view blob(int column) const;
 
+    /** The first column of the first row, for a statement that has one; 0 where there is no row. Instead of next().
+     */
+    std::int64_t firstInteger();
+    std::string firstText(); ///< the same, empty where there is no row
+
   private:
     friend class Database;
 
-    Rows(class Database& database, sqlite3_stmt* statement) : _database(&database), _statement(statement) {}
+    template <typename... Parameters>
+    Rows(Database& database, Cache::node_type&& prepared, const Parameters&... parameters)
+        : _database(database), _prepared(std::move(prepared)) {
+        [[maybe_unused]] int place = 0;
+        (bind(++place, parameters), ...);
+    }
 
     void bind(int place, std::int64_t value);
     void bind(int place, std::string_view value);
     void bind(int place, Blob value);
     void bind(int place, std::nullptr_t);
 
-    Database* _database;
-    sqlite3_stmt* _statement;
+    void check(int result);
+
+    [[nodiscard]] sqlite3_stmt* statement() const { return _prepared.mapped().get(); }
+
+    Database& _database;
+    Cache::node_type _prepared;
 };
 
 /**
@@ -104,13 +131,11 @@ class Database {
      */
     void migrate(const std::string& room, std::span<const std::string_view> steps);
 
-    /** Begins a statement with its parameters, integers, texts (UTF-8), Blobs or nullptr, in their order. */
+    /** Begins a statement with its parameters, integers, texts (UTF-8), Blobs or nullptr, in their order. Texts and
+     * bytes must live as long as the rows. */
     template <typename... Parameters>
     Rows query(std::string_view sql, const Parameters&... parameters) {
-        Rows rows(*this, take(sql));
-        [[maybe_unused]] int place = 0;
-        (rows.bind(++place, parameters), ...);
-        return rows;
+        return Rows(*this, take(sql), parameters...);
     }
 
     /** Runs a statement of which no rows are wanted. */
@@ -131,31 +156,20 @@ class Database {
 
   private:
     friend class Rows;
+    friend class Transaction;
 
     struct Close {
         void operator()(sqlite3* handle) const;
     };
 
-    struct Finalize {
-        void operator()(sqlite3_stmt* statement) const;
-    };
-
-    struct Hash {
-        using is_transparent = void;
-
-        std::size_t operator()(std::string_view text) const { return std::hash<std::string_view>()(text); }
-    };
-
-    using Prepared = std::unique_ptr<sqlite3_stmt, Finalize>;
-
     void open();
     void identify();
-    sqlite3_stmt* take(std::string_view sql);
+    Cache::node_type take(std::string_view sql);
     [[noreturn]] void fail(std::string_view what) const;
 
     std::filesystem::path _file;
     std::unique_ptr<sqlite3, Close> _handle;
-    std::unordered_map<std::string, Prepared, Hash, std::equal_to<>> _cache;
+    Cache _cache;
 };
 
 /** Several statements that take effect together: what is not committed when this ends never happened. */
