@@ -184,6 +184,12 @@ class WatchedHost : public MarloTest {
         return "sed -i '/identity = \"" + adapter + "\"/,/status/ s/^status = .*/status = " + status +
                "/' host.toml\n";
     }
+
+    /** Waits until so many lines have come: of two changes that the file shows at once, either may be told first. */
+    static std::string awaitLines(int count) {
+        return "for i in {1..400}; do [ $(wc -l <out) -ge " + std::to_string(count) +
+               " ] && break; sleep 0.05; done\n";
+    }
 };
 
 constexpr const char* timePattern = "20[0-9][0-9]-[0-9][0-9]-[0-9][0-9] [0-9][0-9]:[0-9][0-9]:[0-9][0-9]  ";
@@ -191,7 +197,7 @@ constexpr const char* timePattern = "20[0-9][0-9]-[0-9][0-9]-[0-9][0-9] [0-9][0-
 TEST_F(WatchedHost, ShowsWhatHappensToItsAdapters) {
     const Outcome outcome =
         watch("--count 3 --timeout 60",
-              change("eth0", "12") + "sleep 0.5\n" + change("eth0", "1") + "sleep 0.5\n" + change("bond0", "5"));
+              change("eth0", "12") + awaitLines(1) + change("eth0", "1") + awaitLines(2) + change("bond0", "5"));
     EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
     EXPECT_THAT(linesOf(outcome.out),
                 ElementsAre(MatchesRegex(std::string(timePattern) + "eth0      Offline     Degraded/Warning  .+"),
@@ -209,11 +215,8 @@ TEST_F(WatchedHost, ShowsOnlyWhatWasAskedFor) {
 }
 
 TEST_F(WatchedHost, PrintsEachLineAtOnce) {
-    const Outcome outcome =
-        watch("--count 2 --timeout 60", change("eth0", "12") +
-                                            "for i in {1..400}; do [ -s out ] && break; sleep 0.05; done\n"
-                                            "wc -l < out > seen\n" +
-                                            change("eth0", "1"));
+    const Outcome outcome = watch("--count 2 --timeout 60", change("eth0", "12") + awaitLines(1) +
+                                                                "wc -l < out > seen\n" + change("eth0", "1"));
     EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
     EXPECT_EQ(readFile(path("seen")), "1\n");
 }
@@ -222,8 +225,7 @@ TEST_F(WatchedHost, EndsCleanlyWhenInterrupted) {
     const std::vector<std::pair<std::string, std::string>> signalsAndStatuses = {{"INT", "12"}, {"TERM", "1"}};
     for (const auto& [signal, status] : signalsAndStatuses) {
         const std::string kill = "kill -" + signal + " $pid\n";
-        const std::string seen = "for i in {1..400}; do [ -s out ] && break; sleep 0.05; done\n";
-        const Outcome outcome = watch("", change("eth0", status) + seen + kill);
+        const Outcome outcome = watch("", change("eth0", status) + awaitLines(1) + kill);
         EXPECT_EQ(outcome.exitCode, 0) << signal << outcome.err;
         EXPECT_THAT(linesOf(outcome.out), SizeIs(1)) << signal;
         EXPECT_EQ(outcome.err, "marlo: watching; interrupt to end\n") << signal;
