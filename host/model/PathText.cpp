@@ -6,6 +6,7 @@
 
 #include <cerrno>
 #include <charconv>
+#include <cmath>
 #include <cstdlib>
 #include <stdexcept>
 
@@ -275,6 +276,9 @@ class PathReader {
         const double value = std::strtod(text.c_str(), &end);
         if (end != text.c_str() + text.size()) {
             fail(start, "a number, found '" + text + "'");
+        }
+        if (!std::isfinite(value)) {
+            fail(start, "a real number of at most 64 bits, found '" + text + "'");
         }
         return {CMPI_real64, value};
     }

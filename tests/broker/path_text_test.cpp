@@ -101,6 +101,7 @@ INSTANTIATE_TEST_SUITE_P(
         Refusal{"C.K=1,k=2", "position 7: expected a key that was not given yet, found 'k' again"},
         Refusal{"C.K=12x", "position 5: expected a number, found '12x'"},
         Refusal{"C.K=1.x", "position 5: expected a number, found '1.x'"},
+        Refusal{"C.K=1e309", "position 5: expected a real number of at most 64 bits, found '1e309'"},
         Refusal{"C.K=-", "position 5: expected a number, found '-'"},
         Refusal{"C.K=18446744073709551616", "position 5: expected an integer of at most 64 bits"},
         Refusal{"C.K=-9223372036854775809", "position 5: expected an integer of at most 64 bits"},
