@@ -61,27 +61,49 @@ std::optional<std::string_view> parameter(std::string_view part, std::string_vie
     return value;
 }
 
-/** The quality (RFC 9110 12.4.2) among the parameters of a choice: 0 rules it out. */
-bool isRuledOut(const std::vector<std::string_view>& parts) {
-    return std::any_of(parts.begin() + 1, parts.end(), [](std::string_view part) {
-        const auto quality = parameter(part, "q");
-        return quality && std::strtod(std::string(*quality).c_str(), nullptr) <= 0;
-    });
-}
-
-/** Whether a field of choices leaves one of these; a client without the field takes anything. */
-bool accepts(const http::RequestHead& head, std::string_view field, const std::vector<std::string_view>& offers) {
-    const auto values = head.values(field);
-    bool taken = values.empty();
-    for (const std::string_view value : values) {
-        for (const std::string_view choice : split(value, ',')) {
-            const auto parts = split(choice, ';');
-            const bool named = std::any_of(offers.begin(), offers.end(),
-                                           [&parts](std::string_view offer) { return equalNames(offer, parts[0]); });
-            taken = taken || (named && !isRuledOut(parts));
+/** The quality among the parameters of a choice: how much it is liked, 0 rules it out. */
+double qualityOf(const std::vector<std::string_view>& parts) {
+    for (std::size_t i = 1; i < parts.size(); ++i) {
+        if (const auto quality = parameter(parts[i], "q")) {
+            return std::strtod(std::string(*quality).c_str(), nullptr);
         }
     }
-    return taken;
+    return 1;
+}
+
+/** How closely a choice, such as text/xml, text/<any> or <any>/<any>, names an offer: 0 where it does not. */
+int closeness(std::string_view choice, std::string_view offer) {
+    if (equalNames(choice, offer)) {
+        return 3;
+    }
+    const auto slash = offer.find('/');
+    if (slash != std::string_view::npos && choice.ends_with("/*") &&
+        equalNames(choice.substr(0, choice.size() - 2), offer.substr(0, slash))) {
+        return 2;
+    }
+    return choice == "*/*" || choice == "*" ? 1 : 0;
+}
+
+/**
+ * How much a client likes an offer (RFC 9110 12.5.1): what the choice says that names it most closely. One without
+ * the field, or with an empty one, takes anything.
+ */
+double likingOf(const http::RequestHead& head, std::string_view field, std::string_view offer) {
+    int closest = 0;
+    double liking = 0;
+    bool anything = true;
+    for (const std::string_view value : head.values(field)) {
+        for (const std::string_view choice : split(value, ',')) {
+            const auto parts = split(choice, ';');
+            const int close = closeness(parts[0], offer);
+            anything = anything && parts[0].empty();
+            if (close > closest) {
+                closest = close;
+                liking = qualityOf(parts);
+            }
+        }
+    }
+    return anything ? 1 : liking;
 }
 
 bool isUtf8Xml(std::string_view contentType) {
@@ -142,23 +164,43 @@ std::string_view withoutSlashes(std::string_view nameSpace) {
 
 bool samePaths(const ObjectPath& left, const ObjectPath& right);
 
+std::optional<ObjectPath> readPath(std::string_view text) {
+    if (text.starts_with('/') && !text.starts_with("//")) {
+        text.remove_prefix(1); // "/root/cimv2:..." is a path without a host
+    }
+    try {
+        return ObjectPath::parse(text);
+    } catch (const std::invalid_argument&) {
+        return std::nullopt;
+    }
+}
+
+/** The path that a value is, or that its text tells. */
+std::optional<ObjectPath> pathOf(const Value& value) {
+    if (const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&value.data)) {
+        return **path;
+    }
+    const auto* text = std::get_if<std::string>(&value.data);
+    return text == nullptr ? std::nullopt : readPath(*text);
+}
+
+std::string plainText(const Value& value) {
+    if (const auto* text = std::get_if<std::string>(&value.data)) {
+        return *text;
+    }
+    const auto* moment = std::get_if<DateTime>(&value.data);
+    return moment != nullptr ? moment->text : toText(value);
+}
+
 /** The texts of a path have no types, elements of XML have some: 1 and "1" are the same here. */
 bool sameKeys(const Value& left, const Value& right) {
-    const auto* leftPath = std::get_if<std::shared_ptr<const ObjectPath>>(&left.data);
-    const auto* rightPath = std::get_if<std::shared_ptr<const ObjectPath>>(&right.data);
-    if (leftPath != nullptr && rightPath != nullptr) {
-        return samePaths(**leftPath, **rightPath);
+    using Path = std::shared_ptr<const ObjectPath>;
+    if (!std::holds_alternative<Path>(left.data) && !std::holds_alternative<Path>(right.data)) {
+        return plainText(left) == plainText(right);
     }
-    const auto plain = [](const Value& value) {
-        const auto* text = std::get_if<std::string>(&value.data);
-        const auto* moment = std::get_if<DateTime>(&value.data);
-        const auto* path = std::get_if<std::shared_ptr<const ObjectPath>>(&value.data);
-        return text != nullptr     ? *text
-               : moment != nullptr ? moment->text
-               : path != nullptr   ? (*path)->toString()
-                                   : toText(value);
-    };
-    return plain(left) == plain(right);
+    const auto leftPath = pathOf(left);
+    const auto rightPath = pathOf(right);
+    return leftPath && rightPath && samePaths(*leftPath, *rightPath);
 }
 
 bool samePaths(const ObjectPath& left, const ObjectPath& right) {
@@ -172,11 +214,8 @@ bool samePaths(const ObjectPath& left, const ObjectPath& right) {
 }
 
 bool sameObjects(const std::string& field, const ObjectPath& path) {
-    try {
-        return samePaths(ObjectPath::parse(withoutSlashes(field)), path);
-    } catch (const std::invalid_argument&) {
-        return false;
-    }
+    const auto read = readPath(field);
+    return read && samePaths(*read, path);
 }
 
 } // namespace
@@ -237,15 +276,17 @@ std::optional<std::string> readPrefix(const http::RequestHead& head) {
                     std::string("M-POST needs the extension of the field Man: ") + extensionUri + "; ns=NN");
 }
 
-void checkContent(const http::RequestHead& head) {
+std::string checkContent(const http::RequestHead& head) {
     const auto types = head.values("Content-Type");
     if (types.size() > 1 || (types.size() == 1 && !isUtf8Xml(types[0]))) {
         throw HttpError(unsupportedMediaType, "", "requests are application/xml or text/xml in UTF-8");
     }
-    if (!accepts(head, "Accept", {"application/xml", "text/xml", "application/*", "text/*", "*/*"}) ||
-        !accepts(head, "Accept-Charset", {"utf-8", "*"})) {
-        throw HttpError(notAcceptable, "", "answers are application/xml in UTF-8");
+    const double application = likingOf(head, "Accept", "application/xml");
+    const double text = likingOf(head, "Accept", "text/xml");
+    if (std::max(application, text) <= 0 || likingOf(head, "Accept-Charset", "utf-8") <= 0) {
+        throw HttpError(notAcceptable, "", "answers are application/xml or text/xml in UTF-8");
     }
+    return text > application ? "text/xml" : "application/xml";
 }
 
 CimFields readCimFields(const http::RequestHead& head, std::optional<std::string> prefix) {

@@ -19,8 +19,9 @@ inline constexpr const char* extensionUri = "http://www.dmtf.org/cim/mapping/htt
 struct CimFields {
     /** Of M-POST: what precedes the names of the fields, "73-" for ns=73, in the request and in its answer. */
     std::optional<std::string> prefix;
-    std::string method; ///< CIMMethod, decoded
-    std::string object; ///< CIMObject, decoded
+    std::string answerType; ///< of the answer's XML
+    std::string method;     ///< CIMMethod, decoded
+    std::string object;     ///< CIMObject, decoded
 };
 
 /**
@@ -29,8 +30,11 @@ struct CimFields {
  */
 std::optional<std::string> readPrefix(const http::RequestHead& head);
 
-/** Throws HttpError unless the body is XML in UTF-8 (415) and the client takes that for an answer (406). */
-void checkContent(const http::RequestHead& head);
+/**
+ * Throws HttpError unless the body is XML in UTF-8 (415) and the client takes that for an answer (406). Returns the
+ * name by which it likes XML better: "application/xml", or "text/xml".
+ */
+std::string checkContent(const http::RequestHead& head);
 
 /**
  * Reads the fields of CIM, under M-POST with or without the prefix. Throws HttpError: 400 unsupported-operation for

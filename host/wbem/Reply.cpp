@@ -23,25 +23,25 @@ void end(cimxml::Writer& writer, const ReplyHead& head) {
     writer.finish();
 }
 
-} // namespace
-
-http::Fields answerFields(const std::optional<std::string>& prefix) {
-    http::Fields fields{{"Content-Type", "application/xml; charset=utf-8"}, {"Cache-Control", "no-cache"}};
-    if (prefix) {
-        const std::string number = prefix->substr(0, prefix->size() - 1);
+http::Fields answerFields(const ReplyHead& head) {
+    http::Fields fields{{"Content-Type", head.type + "; charset=utf-8"}, {"Cache-Control", "no-cache"}};
+    if (head.prefix) {
+        const std::string number = head.prefix->substr(0, head.prefix->size() - 1);
         fields.push_back({"Ext", ""});
         fields.push_back({"Man", std::string(extensionUri) + "; ns=" + number});
     }
-    fields.push_back({prefix.value_or("") + "CIMOperation", "MethodResponse"});
+    fields.push_back({head.prefix.value_or("") + "CIMOperation", "MethodResponse"});
     return fields;
 }
+
+} // namespace
 
 Reply::Reply(http::Responder& responder, ReplyHead head) : _responder(responder), _head(std::move(head)) {}
 
 void Reply::hand(std::string_view piece) {
     if (!_begun) {
         _begun = true;
-        http::Fields fields = answerFields(_head.prefix);
+        http::Fields fields = answerFields(_head);
         if (_head.trailers) {
             fields.push_back({"Trailer", "CIMStatusCode, CIMStatusCodeDescription"});
         }
@@ -100,7 +100,7 @@ void Reply::fail(unsigned code, const std::string& description) {
     }
     _state = State::ended;
     http::Answer answer;
-    answer.fields = answerFields(_head.prefix);
+    answer.fields = answerFields(_head);
     answer.body = errorDocument(code, description);
     const std::size_t size = answer.body.size();
     if (_begun) {

@@ -20,6 +20,7 @@ struct ReplyHead {
     std::string method;
     bool intrinsic = true;
     std::string host;                  ///< in paths that carry one
+    std::string type;                  ///< "application/xml" or "text/xml"
     std::optional<std::string> prefix; ///< of the fields of CIM, where M-POST declared one
     bool trailers = false;             ///< the client takes them
 };
@@ -58,8 +59,5 @@ class Reply {
     std::size_t _bytes = 0;
     std::unique_ptr<cimxml::Writer> _writer;
 };
-
-/** The fields of an answer that is XML; `operation` is the value of CIMOperation. */
-http::Fields answerFields(const std::optional<std::string>& prefix);
 
 } // namespace marlo::wbem

@@ -194,8 +194,10 @@ void Service::State::answer(const http::Request& request, http::Responder& respo
     }
     const CimFields fields = [&request] {
         auto prefix = readPrefix(request.head);
-        checkContent(request.head);
-        return readCimFields(request.head, std::move(prefix));
+        std::string type = checkContent(request.head);
+        CimFields read = readCimFields(request.head, std::move(prefix));
+        read.answerType = std::move(type);
+        return read;
     }();
     const cimxml::Message message = readMessage(request.body, options.limits.xml);
     compareWithBody(fields, message);
@@ -204,8 +206,8 @@ void Service::State::answer(const http::Request& request, http::Responder& respo
     record.operation = intrinsic != nullptr ? intrinsic->method : extrinsic->method;
     record.nameSpace = intrinsic != nullptr ? intrinsic->nameSpace : extrinsic->path.nameSpace;
     record.className = intrinsic != nullptr ? subjectOf(*intrinsic) : extrinsic->path.className;
-    Reply reply(responder, {message.id, record.operation, intrinsic != nullptr, options.host, fields.prefix,
-                            takesTrailers(request.head)});
+    Reply reply(responder, {message.id, record.operation, intrinsic != nullptr, options.host, fields.answerType,
+                            fields.prefix, takesTrailers(request.head)});
     operate(message, identity, reply, record);
     record.httpStatus = 200;
     record.bytesOut = reply.bytes();
