@@ -123,6 +123,11 @@ TEST_F(ObjectManagerTest, GetsOneInstanceByItsKeys) {
     ASSERT_TRUE(answer.status.ok()) << answer.status.message;
     EXPECT_THAT(answer.paths, ElementsAre("root/test:Test_Thing.Id=\"a\",Number=1"));
     EXPECT_EQ(propertiesOf(answer.instances[0]), "Note=\"Test_Thing\"");
+    const Answer list = get("root/test:Test_Thing.Id=\"a\",Number=1", std::vector<std::string>{"List"});
+    EXPECT_EQ(propertiesOf(list.instances.at(0)), "List={\"List\",\"Id\",\"Number\"}") << "what it was asked for";
+    const Answer none = get("root/test:Test_Thing.Id=\"a\",Number=1", std::vector<std::string>{});
+    EXPECT_EQ(none.paths, answer.paths);
+    EXPECT_EQ(propertiesOf(none.instances.at(0)), "");
 }
 
 TEST_F(ObjectManagerTest, AnswersNotFoundWhenTheProviderGivesNothing) {

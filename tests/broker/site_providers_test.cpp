@@ -122,6 +122,15 @@ TEST_F(Items, AreMadeByAProviderThatReturnsNoPath) {
     EXPECT_EQ(created.toString(), item("silent"));
 }
 
+TEST_F(Items, KeepTheBytesOfTheirTextsWhateverTheyAre) {
+    provide("Store", "Test_Item");
+    const std::string odd = "\xff\xc3 \x01";
+    ASSERT_TRUE(create(odd).ok());
+    EXPECT_THAT(paths(), ElementsAre(item(odd)));
+    EXPECT_EQ(property(odd, "Id"), '"' + odd + '"');
+    EXPECT_TRUE(remove(odd).ok());
+}
+
 TEST_F(Items, FailuresToMakeAndDeleteThemAreAnswered) {
     provide("Store", "Test_Item");
     ASSERT_TRUE(create("a").ok());
