@@ -3,6 +3,7 @@
 #include "host/http/Roster.h"
 #include "host/http/Sockets.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <utility>
 
@@ -16,6 +17,8 @@ using std::chrono::milliseconds;
 constexpr milliseconds never{-1};
 /** Of a refused request, what is read so that its sender comes to see why. */
 constexpr std::size_t mostDiscarded = std::size_t{64} * 1024 * 1024;
+/** When the server stops, those whose last answer has been sent do not use up its patience. */
+constexpr milliseconds lingerAtEnd{500};
 /** An idle connection keeps no more than this of its memory. */
 constexpr std::size_t keptCapacity = std::size_t{4} * 1024;
 
@@ -253,7 +256,8 @@ void Connection::sendRest() {
 void Connection::linger() {
     _stream->finish();
     _input.clear();
-    enter(State::lingering, _site.limits.lingerTime);
+    enter(State::lingering,
+          _site.isStopping ? std::min(_site.limits.lingerTime, lingerAtEnd) : _site.limits.lingerTime);
     discard();
 }
 
