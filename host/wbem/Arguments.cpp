@@ -1,5 +1,7 @@
 #include "host/wbem/Arguments.h"
 
+#include "host/cimom/References.h"
+
 #include <algorithm>
 #include <array>
 #include <utility>
@@ -25,17 +27,6 @@ bool isListed(std::string_view names, std::string_view name) {
         names.remove_prefix(std::min(end + 1, names.size()));
     }
     return false;
-}
-
-/** Namespaces as `root/cimv2`: clients write slashes before and behind them, too. */
-std::string_view plainNameSpace(std::string_view text) {
-    while (text.starts_with('/')) {
-        text.remove_prefix(1);
-    }
-    while (text.ends_with('/')) {
-        text.remove_suffix(1);
-    }
-    return text;
 }
 
 } // namespace
@@ -149,7 +140,7 @@ PropertyList Arguments::propertyList() const {
 }
 
 ObjectPath Arguments::local(std::string_view name, ObjectPath path) const {
-    if (!path.nameSpace.empty() && !equalNames(plainNameSpace(path.nameSpace), plainNameSpace(_call.nameSpace))) {
+    if (!path.nameSpace.empty() && spellNameSpace(_schema, path.nameSpace) != _nameSpace) {
         refuse("the parameter " + std::string(name) + " of " + _call.method + " is of the namespace " +
                path.nameSpace + ", but the call of " + _call.nameSpace);
     }
@@ -180,6 +171,15 @@ Instance Arguments::instance(std::string_view name) const {
         refuseType(_call, name, "an instance");
     }
     return {local(name, instance->path), instance->properties};
+}
+
+AssociationFilter readAssociatorFilter(const Arguments& arguments) {
+    return {arguments.optionalClassName("AssocClass"), arguments.optionalClassName("ResultClass"),
+            arguments.optionalText("Role"), arguments.optionalText("ResultRole")};
+}
+
+AssociationFilter readReferenceFilter(const Arguments& arguments) {
+    return {arguments.optionalClassName("ResultClass"), "", arguments.optionalText("Role"), ""};
 }
 
 void nameLoneKey(const Schema& schema, ObjectPath& path) {

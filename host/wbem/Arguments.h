@@ -60,6 +60,12 @@ class Arguments {
     std::string _nameSpace;
 };
 
+/** The parameters AssocClass, ResultClass, Role and ResultRole of associators. */
+AssociationFilter readAssociatorFilter(const Arguments& arguments);
+
+/** ResultClass and Role of references, whose ResultClass is the class of the association. */
+AssociationFilter readReferenceFilter(const Arguments& arguments);
+
 /** Gives a key without a name, as DSP0201 allows it where there is one alone, the name that the schema has for it. */
 void nameLoneKey(const Schema& schema, ObjectPath& path);
 

@@ -14,16 +14,6 @@ using cimxml::PathWrap;
 using cimxml::Wrap;
 using Classes = std::vector<const Class*>;
 
-/** The parameters of associators; of references ResultClass is the class of the association. */
-AssociationFilter readAssociatorFilter(const Arguments& arguments) {
-    return {arguments.optionalClassName("AssocClass"), arguments.optionalClassName("ResultClass"),
-            arguments.optionalText("Role"), arguments.optionalText("ResultRole")};
-}
-
-AssociationFilter readReferenceFilter(const Arguments& arguments) {
-    return {arguments.optionalClassName("ResultClass"), "", arguments.optionalText("Role"), ""};
-}
-
 /** Classes that are named must be there: that of an object, and those of a filter, which are but parameters. */
 void requireClasses(const Call& call, const ObjectPath& object, const AssociationFilter& filter) {
     requireClass(call.manager.schema(), call.nameSpace, object.className);

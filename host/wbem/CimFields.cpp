@@ -1,10 +1,9 @@
 #include "host/wbem/CimFields.h"
 
+#include "host/wbem/FieldText.h"
 #include "host/wbem/HttpError.h"
 
 #include <algorithm>
-#include <cctype>
-#include <cstdlib>
 #include <memory>
 #include <stdexcept>
 #include <vector>
@@ -15,106 +14,11 @@ namespace {
 
 constexpr unsigned badRequest = 400;
 constexpr unsigned methodNotAllowed = 405;
-constexpr unsigned notAcceptable = 406;
-constexpr unsigned unsupportedMediaType = 415;
 constexpr unsigned notImplemented = 501;
 constexpr unsigned notExtended = 510;
 
 [[noreturn]] void mismatch(const std::string& reason) {
     throw HttpError(badRequest, "header-mismatch", reason);
-}
-
-std::string_view trimmed(std::string_view text) {
-    const auto first = text.find_first_not_of(" \t");
-    if (first == std::string_view::npos) {
-        return {};
-    }
-    return text.substr(first, text.find_last_not_of(" \t") - first + 1);
-}
-
-/** The parts between a separator, trimmed; one within double quotes separates nothing. */
-std::vector<std::string_view> split(std::string_view text, char separator) {
-    std::vector<std::string_view> parts;
-    std::size_t begin = 0;
-    bool quoted = false;
-    for (std::size_t i = 0; i <= text.size(); ++i) {
-        if (i == text.size() || (text[i] == separator && !quoted)) {
-            parts.push_back(trimmed(text.substr(begin, i - begin)));
-            begin = i + 1;
-        } else if (text[i] == '"') {
-            quoted = !quoted;
-        }
-    }
-    return parts;
-}
-
-/** The value of `name=value` or `name="value"`; nothing where the part is of another name. */
-std::optional<std::string_view> parameter(std::string_view part, std::string_view name) {
-    const auto equals = part.find('=');
-    if (equals == std::string_view::npos || !equalNames(trimmed(part.substr(0, equals)), name)) {
-        return std::nullopt;
-    }
-    std::string_view value = trimmed(part.substr(equals + 1));
-    if (value.size() >= 2 && value.front() == '"' && value.back() == '"') {
-        value = value.substr(1, value.size() - 2);
-    }
-    return value;
-}
-
-/** The quality among the parameters of a choice: how much it is liked, 0 rules it out. */
-double qualityOf(const std::vector<std::string_view>& parts) {
-    for (std::size_t i = 1; i < parts.size(); ++i) {
-        if (const auto quality = parameter(parts[i], "q")) {
-            return std::strtod(std::string(*quality).c_str(), nullptr);
-        }
-    }
-    return 1;
-}
-
-/** How closely a choice, such as text/xml, text/<any> or <any>/<any>, names an offer: 0 where it does not. */
-int closeness(std::string_view choice, std::string_view offer) {
-    if (equalNames(choice, offer)) {
-        return 3;
-    }
-    const auto slash = offer.find('/');
-    if (slash != std::string_view::npos && choice.ends_with("/*") &&
-        equalNames(choice.substr(0, choice.size() - 2), offer.substr(0, slash))) {
-        return 2;
-    }
-    return choice == "*/*" || choice == "*" ? 1 : 0;
-}
-
-/**
- * How much a client likes an offer (RFC 9110 12.5.1): what the choice says that names it most closely. One without
- * the field, or with an empty one, takes anything.
- */
-double likingOf(const http::RequestHead& head, std::string_view field, std::string_view offer) {
-    int closest = 0;
-    double liking = 0;
-    bool anything = true;
-    for (const std::string_view value : head.values(field)) {
-        for (const std::string_view choice : split(value, ',')) {
-            const auto parts = split(choice, ';');
-            const int close = closeness(parts[0], offer);
-            anything = anything && parts[0].empty();
-            if (close > closest) {
-                closest = close;
-                liking = qualityOf(parts);
-            }
-        }
-    }
-    return anything ? 1 : liking;
-}
-
-bool isUtf8Xml(std::string_view contentType) {
-    const auto parts = split(contentType, ';');
-    if (!equalNames(parts[0], "application/xml") && !equalNames(parts[0], "text/xml")) {
-        return false;
-    }
-    return std::all_of(parts.begin() + 1, parts.end(), [](std::string_view part) {
-        const auto charset = parameter(part, "charset");
-        return !charset || equalNames(*charset, "utf-8");
-    });
 }
 
 /** The one value of a field of CIM. Given with and without the prefix, or twice, it could say two things. */
@@ -142,14 +46,6 @@ std::string requireDecoded(const http::RequestHead& head, const std::optional<st
         mismatch("the field " + name + " has a % that two hexadecimal digits do not follow");
     }
     return *std::move(decoded);
-}
-
-int hexDigit(char digit) {
-    if (digit >= '0' && digit <= '9') {
-        return digit - '0';
-    }
-    const int lower = std::tolower(static_cast<unsigned char>(digit));
-    return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
 }
 
 std::string_view withoutSlashes(std::string_view nameSpace) {
@@ -220,38 +116,6 @@ bool sameObjects(const std::string& field, const ObjectPath& path) {
 
 } // namespace
 
-std::optional<std::string> percentDecoded(std::string_view text) {
-    std::string decoded;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        if (text[i] != '%') {
-            decoded += text[i];
-            continue;
-        }
-        const int high = i + 2 < text.size() ? hexDigit(text[i + 1]) : -1;
-        const int low = high >= 0 ? hexDigit(text[i + 2]) : -1;
-        if (low < 0) {
-            return std::nullopt;
-        }
-        decoded += static_cast<char>(high * 16 + low);
-        i += 2;
-    }
-    return decoded;
-}
-
-std::string percentEncoded(std::string_view text) {
-    constexpr std::string_view digits = "0123456789ABCDEF";
-    std::string encoded;
-    for (const char character : text) {
-        const auto byte = static_cast<unsigned char>(character);
-        if (byte >= ' ' && byte < 0x7F && character != '%') {
-            encoded += character;
-        } else {
-            encoded += {'%', digits[byte >> 4U], digits[byte & 0xFU]};
-        }
-    }
-    return encoded;
-}
-
 std::optional<std::string> readPrefix(const http::RequestHead& head) {
     if (head.method == "POST") {
         return std::nullopt;
@@ -274,19 +138,6 @@ std::optional<std::string> readPrefix(const http::RequestHead& head) {
     }
     throw HttpError(notExtended, "",
                     std::string("M-POST needs the extension of the field Man: ") + extensionUri + "; ns=NN");
-}
-
-std::string checkContent(const http::RequestHead& head) {
-    const auto types = head.values("Content-Type");
-    if (types.size() > 1 || (types.size() == 1 && !isUtf8Xml(types[0]))) {
-        throw HttpError(unsupportedMediaType, "", "requests are application/xml or text/xml in UTF-8");
-    }
-    const double application = likingOf(head, "Accept", "application/xml");
-    const double text = likingOf(head, "Accept", "text/xml");
-    if (std::max(application, text) <= 0 || likingOf(head, "Accept-Charset", "utf-8") <= 0) {
-        throw HttpError(notAcceptable, "", "answers are application/xml or text/xml in UTF-8");
-    }
-    return text > application ? "text/xml" : "application/xml";
 }
 
 CimFields readCimFields(const http::RequestHead& head, std::optional<std::string> prefix) {

@@ -9,7 +9,6 @@
 
 #include <optional>
 #include <string>
-#include <string_view>
 
 namespace marlo::wbem {
 
@@ -31,12 +30,6 @@ struct CimFields {
 std::optional<std::string> readPrefix(const http::RequestHead& head);
 
 /**
- * Throws HttpError unless the body is XML in UTF-8 (415) and the client takes that for an answer (406). Returns the
- * name by which it likes XML better: "application/xml", or "text/xml".
- */
-std::string checkContent(const http::RequestHead& head);
-
-/**
  * Reads the fields of CIM, under M-POST with or without the prefix. Throws HttpError: 400 unsupported-operation for
  * anything but `CIMOperation: MethodCall`, 501 for a batch and for a protocol that is not 1.x, 400 header-mismatch
  * where a field is missing, doubled or badly encoded.
@@ -48,11 +41,5 @@ CimFields readCimFields(const http::RequestHead& head, std::optional<std::string
  * are compared without case, key values without their types; the host of a path does not count.
  */
 void compareWithBody(const CimFields& fields, const cimxml::Message& message);
-
-/** A text with its %XX escapes resolved; nothing where one is broken. */
-std::optional<std::string> percentDecoded(std::string_view text);
-
-/** A text for a field: what is not printable ASCII, and the percent sign, as %XX. */
-std::string percentEncoded(std::string_view text);
 
 } // namespace marlo::wbem

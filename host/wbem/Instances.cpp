@@ -1,5 +1,7 @@
 #include "host/wbem/Instances.h"
 
+#include "host/cimom/InstanceChecks.h"
+
 #include <algorithm>
 
 namespace marlo::wbem {
@@ -23,24 +25,23 @@ PropertyList readProperties(const Call& call, const std::string& className) {
     PropertyList asked = call.arguments.propertyList();
     if (asked) {
         const auto classes = call.manager.schema().withSubclasses(call.nameSpace, className);
-        asked->erase(std::remove_if(asked->begin(), asked->end(),
-                                    [&classes](const std::string& name) {
-                                        return std::none_of(classes.begin(), classes.end(), [&](const Class* known) {
-                                            return known->findProperty(name) != nullptr;
-                                        });
-                                    }),
-                     asked->end());
+        std::erase_if(*asked, [&classes](const std::string& name) {
+            return std::none_of(classes.begin(), classes.end(),
+                                [&name](const Class* known) { return known->findProperty(name) != nullptr; });
+        });
     }
     return asked;
 }
 
 void cutToClass(const Class& definition, Instance& instance) {
-    auto& properties = instance.properties;
-    properties.erase(std::remove_if(properties.begin(), properties.end(),
-                                    [&definition](const NamedValue& property) {
-                                        return definition.findProperty(property.name) == nullptr;
-                                    }),
-                     properties.end());
+    std::erase_if(instance.properties, [&definition](const NamedValue& property) {
+        return definition.findProperty(property.name) == nullptr;
+    });
+}
+
+void cutToList(const PropertyList& properties, Instance& instance) {
+    std::erase_if(instance.properties,
+                  [&properties](const NamedValue& property) { return !isAsked(properties, property.name); });
 }
 
 } // namespace marlo::wbem

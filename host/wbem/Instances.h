@@ -37,4 +37,7 @@ PropertyList readProperties(const Call& call, const std::string& className);
 /** Leaves the properties of one class: what DeepInheritance=false leaves of instances of its subclasses. */
 void cutToClass(const Class& definition, Instance& instance);
 
+/** Leaves the properties of a list; all where there is none. */
+void cutToList(const PropertyList& properties, Instance& instance);
+
 } // namespace marlo::wbem

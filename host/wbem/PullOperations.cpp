@@ -2,8 +2,8 @@
  * @file
  * Operations that open enumerations and pull from them.
  */
-#include "host/filter/Filter.h"
 #include "host/wbem/Instances.h"
+#include "host/wbem/ResultFilter.h"
 
 #include <functional>
 
@@ -37,53 +37,6 @@ Opening readOpening(const Call& call) {
     }
     opening.firstObjects = call.arguments.number("MaxObjectCount").value_or(0);
     return opening;
-}
-
-/** An instance as the filter of an enumeration sees it. */
-class FilterSubject final : public filter::Subject {
-  public:
-    FilterSubject(const Instance& instance, const Schema& schema) : _instance(instance), _schema(schema) {}
-
-    [[nodiscard]] const Value* property(std::string_view name) const override {
-        const NamedValue* found = findName(_instance.properties, name);
-        return found == nullptr ? nullptr : &found->value;
-    }
-
-    [[nodiscard]] std::string_view className() const override { return _instance.path.className; }
-
-    [[nodiscard]] bool isA(std::string_view className, std::string_view ancestor) const override {
-        return equalNames(className, ancestor) || _schema.isA(_instance.path.nameSpace, className, ancestor);
-    }
-
-  private:
-    const Instance& _instance;
-    const Schema& _schema;
-};
-
-/** FilterQuery and FilterQueryLanguage, which come together or not at all. */
-std::optional<filter::Filter> readFilter(const Call& call) {
-    if (!call.arguments.has("FilterQuery") && !call.arguments.has("FilterQueryLanguage")) {
-        return std::nullopt;
-    }
-    const std::string name = call.arguments.text("FilterQueryLanguage");
-    const std::string query = call.arguments.text("FilterQuery");
-    const auto language = filter::readLanguage(name);
-    if (!language) {
-        throw RequestError(CMPI_RC_ERR_QUERY_LANGUAGE_NOT_SUPPORTED,
-                           "the query language '" + name + "' is not supported, but WQL and DMTF:CQL");
-    }
-    try {
-        auto filter = filter::Filter::parse(query, *language);
-        filter.check(call.manager.schema(), call.nameSpace);
-        return filter;
-    } catch (const filter::Error& error) {
-        throw RequestError(error.code(), error.what());
-    }
-}
-
-bool isWanted(const PropertyList& properties, const std::string& name) {
-    return !properties || std::any_of(properties->begin(), properties->end(),
-                                      [&name](const std::string& wanted) { return equalNames(wanted, name); });
 }
 
 /** Writes a batch, what is to be pulled later, and whether that is nothing. */
@@ -166,17 +119,15 @@ using InstanceOperation =
 
 /** A filter may ask for properties that the client does not: all are read, and those of the list go out. */
 Status openInstances(Call& call, const PropertyList& properties, const InstanceOperation& operation) {
-    const auto filter = readFilter(call);
+    const ResultFilter filter(call.manager.schema(), call.nameSpace, call.arguments);
     Opener opener(call, Pulled::instancesWithPath);
     return opener.open([&](const ObjectManager::InstanceSink& sink) {
-        if (!filter) {
+        if (!filter.isGiven()) {
             return operation(properties, sink);
         }
         return operation(std::nullopt, [&](Instance&& instance) {
-            if (filter->matches(FilterSubject(instance, call.manager.schema()))) {
-                std::erase_if(instance.properties, [&properties](const NamedValue& property) {
-                    return !isWanted(properties, property.name);
-                });
+            if (filter.matches(instance)) {
+                cutToList(properties, instance);
                 sink(std::move(instance));
             }
         });
@@ -186,27 +137,18 @@ Status openInstances(Call& call, const PropertyList& properties, const InstanceO
 /** Paths have no properties but keys, so a filter has the instances read. */
 Status openPaths(Call& call, const InstanceOperation& instances,
                  const std::function<Status(const ObjectManager::PathSink& sink)>& paths) {
-    const auto filter = readFilter(call);
+    const ResultFilter filter(call.manager.schema(), call.nameSpace, call.arguments);
     Opener opener(call, Pulled::paths);
     return opener.openPaths([&](const ObjectManager::PathSink& sink) {
-        if (!filter) {
+        if (!filter.isGiven()) {
             return paths(sink);
         }
         return instances(std::nullopt, [&](Instance&& instance) {
-            if (filter->matches(FilterSubject(instance, call.manager.schema()))) {
+            if (filter.matches(instance)) {
                 sink(std::move(instance.path));
             }
         });
     });
-}
-
-AssociationFilter readAssociatorFilter(const Arguments& arguments) {
-    return {arguments.optionalClassName("AssocClass"), arguments.optionalClassName("ResultClass"),
-            arguments.optionalText("Role"), arguments.optionalText("ResultRole")};
-}
-
-AssociationFilter readReferenceFilter(const Arguments& arguments) {
-    return {arguments.optionalClassName("ResultClass"), "", arguments.optionalText("Role"), ""};
 }
 
 Status pull(Call& call, Pulled pulled) {

@@ -1,6 +1,7 @@
 #include "host/wbem/Reply.h"
 
 #include "host/wbem/CimFields.h"
+#include "host/wbem/FieldText.h"
 
 namespace marlo::wbem {
 

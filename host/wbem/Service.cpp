@@ -1,6 +1,7 @@
 #include "host/wbem/Service.h"
 
 #include "host/wbem/CimFields.h"
+#include "host/wbem/Content.h"
 #include "host/wbem/Enumerations.h"
 #include "host/wbem/HttpError.h"
 #include "host/wbem/MethodCall.h"

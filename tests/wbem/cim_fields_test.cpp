@@ -1,5 +1,5 @@
 /** @file Texts in fields. */
-#include "host/wbem/CimFields.h"
+#include "host/wbem/FieldText.h"
 
 #include <gtest/gtest.h>
 
