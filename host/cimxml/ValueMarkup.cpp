@@ -171,9 +171,9 @@ void appendInstanceName(std::string& out, const ObjectPath& path) {
 }
 
 /**
- * An element of an array. VALUE.NULL came with version 2.2 of the representation, and answers are of version 2.0, whose
- * clients may know no such element and give up on the whole answer: a text that is NULL goes out empty. For other
- * types there is no other way to say it.
+ * An element of an array. VALUE.NULL came with version 2.2 of the representation, and answers are of version 2.0,
+ * whose clients may know no such element and give up on the whole answer: a text that is NULL goes out empty. For
+ * other types there is no other way to say it.
  */
 void appendElement(std::string& out, const Value& element) {
     if (!element.isNull()) {

@@ -54,11 +54,16 @@ class NameSpaceResolver {
 };
 
 void NameSpaceResolver::addQualifierType(const QualifierDeclaration& declaration) {
-    if (_nameSpace.findQualifierType(declaration.name) != nullptr) {
-        throw Error(declaration.at, "qualifier " + declaration.name + " is declared already");
+    if (const QualifierType* const earlier = _nameSpace.findQualifierType(declaration.name)) {
+        // MOF of other makers declares the qualifiers that it uses: the first declaration holds for all.
+        if (earlier->file == *declaration.at.file || earlier->defaultValue.type != declaration.type) {
+            throw Error(declaration.at, "qualifier " + declaration.name + " is declared already");
+        }
+        return;
     }
     QualifierType type;
     type.name = declaration.name;
+    type.file = *declaration.at.file;
     type.defaultValue = declaration.defaultValue ? makeValue(declaration.type, *declaration.defaultValue,
                                                              "the default of qualifier " + declaration.name)
                                                  : Value::null(declaration.type);

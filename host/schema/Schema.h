@@ -38,6 +38,7 @@ struct QualifierType {
     bool overridable = true;
     bool toSubclass = true;
     bool translatable = false;
+    std::string file; ///< that declares it first
 };
 
 /** A property of a class, declared there or inherited. */

@@ -1,5 +1,6 @@
 #include "tests/schema/Mof.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
@@ -75,6 +76,19 @@ TEST_F(SchemaReader, RefusesANamespacesClassThatAllHaveAlready) {
     write("a.mof", "class A {};");
     write("b.mof", "#pragma namespace (\"root/one\")\nclass A {};");
     EXPECT_EQ(error(), path("b.mof") + ":2:7: class A is declared already, at " + path("a.mof") + ":1");
+}
+
+TEST_F(SchemaReader, TakesTheFirstOfAQualifiersDeclarationsInSeveralFiles) {
+    write("a.mof", "Qualifier Mine : boolean = false, Scope(class), Flavor(DisableOverride);\n");
+    write("b.mof", "Qualifier MINE : boolean = true, Scope(any);\n#pragma namespace (\"root/one\")\n[Mine] class A {};");
+    const Schema schema = read();
+    const auto types = schema.qualifierTypes("root/one");
+    const auto mine =
+        std::find_if(types.begin(), types.end(), [](const QualifierType* type) { return type->name == "Mine"; });
+    ASSERT_NE(mine, types.end());
+    EXPECT_FALSE((*mine)->overridable);
+    write("c.mof", "Qualifier Mine : string, Scope(any);\n");
+    EXPECT_EQ(error(), path("c.mof") + ":1:11: qualifier Mine is declared already");
 }
 
 TEST_F(SchemaReader, DoesNotLookForSuperclassesInOtherNamespaces) {
