@@ -156,6 +156,14 @@ const Schema& ObjectManager::schema() const {
     return _state->core.schema;
 }
 
+std::vector<ProviderHealth> ObjectManager::providerHealth() const {
+    std::vector<ProviderHealth> all;
+    for (const auto& provider : _state->core.providers) {
+        all.push_back(provider->health());
+    }
+    return all;
+}
+
 std::string ObjectManager::spell(const std::string& nameSpace) const {
     return spellNameSpace(_state->core.schema, nameSpace);
 }

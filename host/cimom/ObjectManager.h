@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "host/cimom/ProviderHealth.h"
 #include "host/model/AssociationFilter.h"
 #include "host/model/Instance.h"
 #include "host/schema/Schema.h"
@@ -185,6 +186,9 @@ class ObjectManager {
     Status unsubscribe(SubscriptionId id);
 
     [[nodiscard]] const Schema& schema() const;
+
+    /** Of every registered provider, in the order of their registrations. Waits for none. */
+    [[nodiscard]] std::vector<ProviderHealth> providerHealth() const;
 
     /** A namespace as the schema spells it, for what is asked of the schema itself (spellNameSpace). */
     [[nodiscard]] std::string spell(const std::string& nameSpace) const;

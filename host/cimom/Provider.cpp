@@ -127,28 +127,43 @@ MI& Provider::make(const std::string& kind, const CMPIContext& context) {
     return requireTable(static_cast<MI*>(made), where);
 }
 
-CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
+/** Makes an interface where there is none yet, and remembers how that went. */
+template <typename MI>
+MI& Provider::require(MI*& mi, const std::string& kind, const CMPIContext& context) {
     const std::lock_guard lock(_mutex);
-    if (_instanceMI == nullptr) {
-        _instanceMI = &make<CMPIInstanceMI>("InstanceMI", context);
+    if (mi == nullptr) {
+        try {
+            mi = &make<MI>(kind, context);
+            remember("");
+        } catch (const LoadError& error) {
+            remember(error.what());
+            throw;
+        }
     }
-    return *_instanceMI;
+    return *mi;
+}
+
+void Provider::remember(const std::string& failure) {
+    const std::lock_guard lock(_healthMutex);
+    _isLoaded = _library != nullptr;
+    _failure = failure;
+}
+
+ProviderHealth Provider::health() const {
+    const std::lock_guard lock(_healthMutex);
+    return {_registration.name, _registration.library, _isLoaded, _failure};
+}
+
+CMPIInstanceMI& Provider::instanceMI(const CMPIContext& context) {
+    return require(_instanceMI, "InstanceMI", context);
 }
 
 CMPIMethodMI& Provider::methodMI(const CMPIContext& context) {
-    const std::lock_guard lock(_mutex);
-    if (_methodMI == nullptr) {
-        _methodMI = &make<CMPIMethodMI>("MethodMI", context);
-    }
-    return *_methodMI;
+    return require(_methodMI, "MethodMI", context);
 }
 
 CMPIIndicationMI& Provider::indicationMI(const CMPIContext& context) {
-    const std::lock_guard lock(_mutex);
-    if (_indicationMI == nullptr) {
-        _indicationMI = &make<CMPIIndicationMI>("IndicationMI", context);
-    }
-    return *_indicationMI;
+    return require(_indicationMI, "IndicationMI", context);
 }
 
 bool Provider::hasIndicationMI() {

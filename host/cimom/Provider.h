@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "host/cimom/ProviderHealth.h"
 #include "host/cimom/Registration.h"
 
 #include <mutex>
@@ -46,6 +47,9 @@ class Provider {
     /** True once there is an indication interface: from then on the provider may use the broker at any time. */
     [[nodiscard]] bool hasIndicationMI();
 
+    /** Waits for nobody, a provider that is being loaded least of all. */
+    [[nodiscard]] ProviderHealth health() const;
+
     /** Tells the interfaces that were made that the process ends. Calls no provider that was never used. */
     void cleanUp(const CMPIContext& context);
 
@@ -53,10 +57,16 @@ class Provider {
     void* symbol(const std::string& name);
     template <typename MI>
     MI& make(const std::string& kind, const CMPIContext& context);
+    template <typename MI>
+    MI& require(MI*& mi, const std::string& kind, const CMPIContext& context);
+    void remember(const std::string& failure);
 
     Registration _registration;
     const CMPIBroker* _broker;
-    std::mutex _mutex; ///< guards all below
+    mutable std::mutex _healthMutex; ///< guards the two below; held for moments only
+    bool _isLoaded = false;
+    std::string _failure;
+    std::mutex _mutex; ///< guards all below; held while a provider is loaded
     void* _library = nullptr;
     CMPIInstanceMI* _instanceMI = nullptr;
     CMPIMethodMI* _methodMI = nullptr;

@@ -190,6 +190,10 @@ http::Answer Daemon::State::answerStatus() {
     report.counters = server->counters();
     report.requests = statistics.requests();
     report.latency = statistics.latency();
+    for (const ProviderHealth& each : manager->providerHealth()) {
+        const std::string state = !each.failure.empty() ? "failed" : each.isLoaded ? "loaded" : "idle";
+        report.providers.push_back({each.name, each.library, state, each.failure});
+    }
     report.openEnumerations = service->openEnumerations();
     report.residentBytes = residentBytes();
     report.lostLogLines = log.lost();

@@ -18,7 +18,7 @@ void Health::complete(StatusReport& report, bool logIsFailing, std::size_t worke
     report.uptimeSeconds = static_cast<std::uint64_t>(std::chrono::duration_cast<std::chrono::seconds>(age).count());
     for (const ProviderState& provider : report.providers) {
         if (provider.state == "failed") {
-            report.reasons.push_back("provider " + provider.name + ": " + provider.failure);
+            report.reasons.push_back(provider.failure);
         }
     }
     if (logIsFailing) {
