@@ -49,9 +49,9 @@ void ServedTest::writeConfiguration() const {
     write("server.toml", text);
 }
 
-void ServedTest::serveFixture() {
+void ServedTest::serveSite() {
     for (const char* name : {"schema", "providers"}) {
-        configure("directories", std::string(name) + " = [\"site/" + name + "\"]\n");
+        configure("directories", std::string(name) + " = [\"" MARLO_SITE "/" + name + "\"]\n");
     }
 }
 

@@ -38,8 +38,8 @@ class ServedTest : public MarloTest {
         _arguments.insert(_arguments.end(), more.begin(), more.end());
     }
 
-    /** The classes of the fixture provider, in root/test. */
-    void serveFixture();
+    /** The classes of tests/server/fixtures, in root/served, beside those that are shipped. */
+    void serveSite();
 
     /** Fails the test when the server does not come to serve. */
     void start();
