@@ -114,6 +114,16 @@ bool sameObjects(const std::string& field, const ObjectPath& path) {
     return read && samePaths(*read, path);
 }
 
+void compareMethods(const CimFields& fields, const std::string& method) {
+    if (!equalNames(fields.method, method)) {
+        mismatch("the field CIMMethod says " + fields.method + ", the body " + method);
+    }
+}
+
+[[noreturn]] void differentObject(const CimFields& fields, const std::string& object) {
+    mismatch("the field CIMObject says " + fields.object + ", the body " + object);
+}
+
 } // namespace
 
 std::optional<std::string> readPrefix(const http::RequestHead& head) {
@@ -166,18 +176,17 @@ void compareWithBody(const CimFields& fields, const cimxml::Message& message) {
     if (std::holds_alternative<cimxml::ExportCall>(message.call)) {
         throw HttpError(badRequest, "unsupported-operation", "no indications are received here");
     }
-    const auto* intrinsic = std::get_if<cimxml::IntrinsicCall>(&message.call);
-    const auto* extrinsic = std::get_if<cimxml::ExtrinsicCall>(&message.call);
-    const std::string& method = intrinsic != nullptr ? intrinsic->method : extrinsic->method;
-    if (!equalNames(fields.method, method)) {
-        mismatch("the field CIMMethod says " + fields.method + ", the body " + method);
+    if (const auto* intrinsic = std::get_if<cimxml::IntrinsicCall>(&message.call)) {
+        compareMethods(fields, intrinsic->method);
+        if (!equalNames(withoutSlashes(fields.object), withoutSlashes(intrinsic->nameSpace))) {
+            differentObject(fields, intrinsic->nameSpace);
+        }
+        return;
     }
-    const bool same = intrinsic != nullptr
-                          ? equalNames(withoutSlashes(fields.object), withoutSlashes(intrinsic->nameSpace))
-                          : sameObjects(fields.object, extrinsic->path);
-    if (!same) {
-        mismatch("the field CIMObject says " + fields.object + ", the body " +
-                 (intrinsic != nullptr ? intrinsic->nameSpace : extrinsic->path.toString()));
+    const auto& extrinsic = std::get<cimxml::ExtrinsicCall>(message.call);
+    compareMethods(fields, extrinsic.method);
+    if (!sameObjects(fields.object, extrinsic.path)) {
+        differentObject(fields, extrinsic.path.toString());
     }
 }
 

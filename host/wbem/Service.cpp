@@ -99,6 +99,21 @@ std::string_view pathOf(const http::RequestHead& head) {
     return std::string_view(head.target).substr(0, head.target.find('?'));
 }
 
+/** Notes what is called, on what; true for an intrinsic method. */
+bool describe(const cimxml::Message& message, Record& record) {
+    if (const auto* intrinsic = std::get_if<cimxml::IntrinsicCall>(&message.call)) {
+        record.operation = intrinsic->method;
+        record.nameSpace = intrinsic->nameSpace;
+        record.className = subjectOf(*intrinsic);
+        return true;
+    }
+    const auto& extrinsic = std::get<cimxml::ExtrinsicCall>(message.call);
+    record.operation = extrinsic.method;
+    record.nameSpace = extrinsic.path.nameSpace;
+    record.className = extrinsic.path.className;
+    return false;
+}
+
 } // namespace
 
 struct Service::State {
@@ -202,13 +217,9 @@ void Service::State::answer(const http::Request& request, http::Responder& respo
     }();
     const cimxml::Message message = readMessage(request.body, options.limits.xml);
     compareWithBody(fields, message);
-    const auto* intrinsic = std::get_if<cimxml::IntrinsicCall>(&message.call);
-    const auto* extrinsic = std::get_if<cimxml::ExtrinsicCall>(&message.call);
-    record.operation = intrinsic != nullptr ? intrinsic->method : extrinsic->method;
-    record.nameSpace = intrinsic != nullptr ? intrinsic->nameSpace : extrinsic->path.nameSpace;
-    record.className = intrinsic != nullptr ? subjectOf(*intrinsic) : extrinsic->path.className;
-    Reply reply(responder, {message.id, record.operation, intrinsic != nullptr, options.host, fields.answerType,
-                            fields.prefix, takesTrailers(request.head)});
+    const bool isIntrinsic = describe(message, record);
+    Reply reply(responder, {message.id, record.operation, isIntrinsic, options.host, fields.answerType, fields.prefix,
+                            takesTrailers(request.head)});
     operate(message, identity, reply, record);
     record.httpStatus = 200;
     record.bytesOut = reply.bytes();
