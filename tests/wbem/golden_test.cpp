@@ -7,6 +7,7 @@
 #include <stdexcept>
 
 #include <arpa/inet.h>
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <netinet/in.h>
 #include <sys/socket.h>
@@ -14,6 +15,11 @@
 
 namespace marlo::test {
 namespace {
+
+using testing::EndsWith;
+using testing::HasSubstr;
+using testing::Not;
+using testing::StartsWith;
 
 constexpr const char* recordVariable = "MARLO_RECORD_GOLDEN";
 
@@ -37,8 +43,8 @@ class Socket {
     int _descriptor;
 };
 
-std::string exchangeOverStream(Host& host, const std::string& requests) {
-    http::Server server(host.service(), {}, std::nullopt, {}, [](const std::string& /*line*/) {});
+std::string exchangeOverStream(Host& host, const std::string& requests, const http::Limits& limits = {}) {
+    http::Server server(host.service(), {}, std::nullopt, limits, [](const std::string& /*line*/) {});
     std::array<int, 2> ends{};
     if (socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends.data()) != 0) {
         throw std::runtime_error("no socket pair");
@@ -82,6 +88,44 @@ TEST_P(Golden, OverTcp) {
 
 INSTANTIATE_TEST_SUITE_P(Pairs, Golden, testing::ValuesIn(goldenNames()),
                          [](const testing::TestParamInfo<std::string>& pair) { return pair.param; });
+
+/** A request for a class whose provider fails after a hundred instances, by a client that takes trailers or not. */
+std::string askForTheBrokenOff(const std::string& fields) {
+    Host host;
+    host.items().streamLength = 101;
+    host.items().streamFailsAt = 101;
+    http::Limits limits;
+    limits.gathered = 1000; // so that the answer is on its way when it breaks off
+    const std::string body =
+        "<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\"><MESSAGE ID=\"1\" "
+        "PROTOCOLVERSION=\"1.0\"><SIMPLEREQ><IMETHODCALL "
+        "NAME=\"EnumerateInstances\"><LOCALNAMESPACEPATH><NAMESPACE NAME=\"root\"/><NAMESPACE NAME=\"test\"/>"
+        "</LOCALNAMESPACEPATH><IPARAMVALUE NAME=\"ClassName\"><CLASSNAME NAME=\"TEST_Stream\"/></IPARAMVALUE>"
+        "</IMETHODCALL></SIMPLEREQ></MESSAGE></CIM>";
+    return exchangeOverStream(
+        host,
+        "POST /cimom HTTP/1.1\r\nHost: h\r\nAuthorization: " + Host::credentials(Host::everything) +
+            "\r\nCIMOperation: MethodCall\r\nCIMMethod: EnumerateInstances\r\nCIMObject: "
+            "root/test\r\n" +
+            fields + "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body,
+        limits);
+}
+
+TEST(BrokenOff, EndsWithTheErrorForWhomTakesTrailers) {
+    const std::string answer = askForTheBrokenOff("TE: trailers\r\nConnection: TE\r\n");
+    EXPECT_THAT(answer, HasSubstr("\r\nTransfer-Encoding: chunked\r\n"));
+    EXPECT_THAT(answer, HasSubstr("\r\nTrailer: CIMStatusCode, CIMStatusCodeDescription\r\n"));
+    EXPECT_THAT(answer,
+                EndsWith("\r\n0\r\nCIMStatusCode: 1\r\nCIMStatusCodeDescription: broke off at 100 %25\r\n\r\n"));
+}
+
+TEST(BrokenOff, IsNoWholeAnswerForAllOthers) {
+    const std::string answer = askForTheBrokenOff("");
+    EXPECT_THAT(answer, StartsWith("HTTP/1.1 200 OK\r\n"));
+    EXPECT_THAT(answer, HasSubstr("\r\nTransfer-Encoding: chunked\r\n"));
+    EXPECT_THAT(answer, Not(HasSubstr("\r\n0\r\n")));
+    EXPECT_THAT(answer, Not(HasSubstr("</CIM>")));
+}
 
 TEST(GoldenPairs, AreAtLeastAHundredAndFifty) {
     EXPECT_GE(goldenNames().size(), 150U);
