@@ -63,6 +63,13 @@ void ServedTest::start() {
     _password = lineOf(_said, "\npassword: ");
 }
 
+int ServedTest::startInVain() {
+    writeConfiguration();
+    _server = std::make_unique<Process>(_arguments, _environment, directory(), path("server.err"), _prepare);
+    _said = _server->readUntil("serving");
+    return _server->wait(Patience);
+}
+
 int ServedTest::stop() {
     _server->signal(SIGTERM);
     return _server->wait(Patience);

@@ -34,9 +34,21 @@ class ServedTest : public MarloTest {
 
     void setUp(void (*prepare)()) { _prepare = prepare; }
 
-    void addArguments(const std::vector<std::string>& more) {
-        _arguments.insert(_arguments.end(), more.begin(), more.end());
+    /** Serves the accounts of the host, and is no trial. */
+    void serveAccounts() { std::erase(_arguments, "--trial"); }
+
+    /** A program that the server is started by, with its arguments: "setpriv", ... */
+    void startBy(const std::vector<std::string>& program) {
+        _arguments.insert(_arguments.begin(), program.begin(), program.end());
     }
+
+    /** A shell's commands in a mount namespace of the server's own, before it starts there. */
+    void startBehind(const std::string& commands) {
+        startBy({"unshare", "--mount", "sh", "-ec", commands + "\nexec \"$@\"", "sh"});
+    }
+
+    /** Starts a server that cannot be; its exit status, once it has ended. */
+    int startInVain();
 
     /** The classes of tests/server/fixtures, in root/served, beside those that are shipped. */
     void serveSite();
