@@ -100,7 +100,7 @@ void Connection::sendRefusal(Answer&& refusal) {
     Reply reply(*_stream, _readiness.descriptor(), _isCut, terms(mayDrain()));
     try {
         reply.send(std::move(refusal));
-    } catch (const ClientGone&) { // which the reply remembers
+    } catch (const std::exception&) { // an answer that is not complete ends the connection
     }
     conclude(reply);
 }
@@ -129,7 +129,7 @@ void Connection::answerError(Reply& reply, const std::string& reason) {
     }
     try {
         reply.fail(_site.handler.refuse(500, "an error within the server"), {});
-    } catch (const ClientGone&) { // which the reply remembers
+    } catch (const std::exception&) { // an answer that is not complete ends the connection
     }
 }
 
@@ -139,7 +139,7 @@ void Connection::conclude(Reply& reply) {
     _sent = 0;
     _delay = reply.delay();
     _keepsAlive = reply.keepsAlive();
-    _mustReset = reply.isBroken();
+    _mustReset = reply.isBroken() || !reply.isComplete();
 }
 
 void Connection::done() {

@@ -60,9 +60,6 @@ void Server::State::listen(const Endpoint& endpoint) {
     Loop& loop = *site.workers.loops().front();
     listeners.push_back(
         std::make_shared<Listener>(site, loop, endpoint, [this](Descriptor&& descriptor, Peer&& peer) {
-            if (peer.transport != Transport::local) {
-                sendAtOnce(descriptor.get());
-            }
             adopt(std::move(descriptor), std::move(peer));
         }));
 }
@@ -79,6 +76,9 @@ std::unique_ptr<Stream> Server::State::makeStream(int descriptor, Transport tran
 }
 
 void Server::State::adopt(Descriptor&& descriptor, Peer&& peer) {
+    if (peer.transport != Transport::local) {
+        sendAtOnce(descriptor.get());
+    }
     std::optional<Seats::Seat> seat = site.seats.take(seatName(peer));
     if (!seat) {
         ++site.refusedConnections;

@@ -65,8 +65,8 @@ class Handler {
     virtual std::optional<Answer> admit(const RequestHead& head, const Peer& peer, std::any& admission) = 0;
     virtual void handle(Request&& request, Responder& responder) = 0;
     /**
-     * The answer to what is no HTTP or too much of it (400, 408, 411, 413, 431, 501, 503): nobody has been admitted.
-     * Fields may be added; the reason is for the body.
+     * The answer to what is no HTTP or too much of it (400, 408, 411, 413, 417, 431, 501, 503, 505), and to what was
+     * thrown (500): maybe nobody has been admitted. Fields may be added; the reason is for the body. Does not wait.
      */
     virtual Answer refuse(unsigned status, const std::string& reason) = 0;
 
@@ -149,7 +149,8 @@ class Server {
 
     /**
      * No new connection, no new request; requests that are being handled get `patience` to end and their answers are
-     * sent. Then everything is closed. Once; also called by the destructor with none.
+     * sent. Then everything is closed, and handlers that still run find their clients gone; returns when they have
+     * returned. Once, and not by a handler; also called by the destructor with no patience.
      */
     void stop(std::chrono::milliseconds patience);
 

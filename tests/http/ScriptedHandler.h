@@ -48,6 +48,7 @@ class ScriptedHandler : public Handler {
   public:
     std::function<std::optional<Answer>(const RequestHead&, const Peer&, std::any&)> onAdmit;
     std::function<void(Request&&, Responder&)> onHandle;
+    std::function<void()> onRefuse;
 
     std::optional<Answer> admit(const RequestHead& head, const Peer& peer, std::any& admission) override {
         return onAdmit ? onAdmit(head, peer, admission) : std::nullopt;
@@ -62,6 +63,9 @@ class ScriptedHandler : public Handler {
     }
 
     Answer refuse(unsigned status, const std::string& reason) override {
+        if (onRefuse) {
+            onRefuse();
+        }
         return {status, {{"Content-Type", "text/plain"}}, reason, false, {}};
     }
 };

@@ -179,6 +179,26 @@ TEST_F(Handlers, ThatThrowWhatIsNoExceptionAreAnsweredFor) {
     EXPECT_EQ(asking.readAnswer().status, 500U);
 }
 
+TEST_F(Handlers, ThatThrowOnceMoreWhenTheyAreToRefuseLoseTheConnectionOnly) {
+    handler.onHandle = [](Request&& request, Responder& responder) {
+        if (request.head.target == "/good") {
+            responder.send({});
+        } else {
+            throw std::runtime_error("broken");
+        }
+    };
+    handler.onRefuse = [] { throw std::runtime_error("broken again"); };
+    RawClient asking = clientOf(0);
+    asking.send(get());
+    EXPECT_EQ(asking.readAnswer().status, 0U);
+    RawClient bad = clientOf(0);
+    bad.send("nonsense\n");
+    EXPECT_EQ(bad.readAnswer().status, 0U);
+    RawClient next = clientOf(0);
+    next.send(get("/good"));
+    EXPECT_EQ(next.readAnswer().status, 200U);
+}
+
 TEST_F(Handlers, ThatThrowOnAdmissionAreAnsweredFor) {
     handler.onAdmit = [](const RequestHead&, const Peer&, std::any&) -> std::optional<Answer> {
         throw std::runtime_error("broken");
