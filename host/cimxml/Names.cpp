@@ -75,10 +75,10 @@ constexpr std::string_view elementNames[] = {
 };
 
 constexpr std::string_view attributeNames[] = {
-    "ASSOCIATION",  "CIMVERSION", "CLASS",           "CLASSNAME", "CLASSORIGIN",    "DTDVERSION",  "EmbeddedObject",
-    "ID",           "INDICATION", "ISARRAY",         "METHOD",    "NAME",           "OVERRIDABLE", "PARAMETER",
-    "PROPAGATED",   "PROPERTY",   "PROTOCOLVERSION", "REFERENCE", "REFERENCECLASS", "SUPERCLASS",  "TOSUBCLASS",
-    "TRANSLATABLE", "TYPE",       "VALUETYPE",
+    "ASSOCIATION", "CIMVERSION",     "CLASS",        "CLASSNAME",  "CLASSORIGIN",     "CODE",      "DESCRIPTION",
+    "DTDVERSION",  "EmbeddedObject", "ID",           "INDICATION", "ISARRAY",         "METHOD",    "NAME",
+    "OVERRIDABLE", "PARAMETER",      "PROPAGATED",   "PROPERTY",   "PROTOCOLVERSION", "REFERENCE", "REFERENCECLASS",
+    "SUPERCLASS",  "TOSUBCLASS",     "TRANSLATABLE", "TYPE",       "VALUETYPE",
 };
 
 static_assert(std::is_sorted(std::begin(elementNames), std::end(elementNames)));
