@@ -89,8 +89,9 @@ struct Options {
  */
 class Delivery {
   public:
-    /** Stands for all posts so far; they become durable in their order. */
+    /** Stands for one post. Posts become durable in their order. */
     using Ticket = std::uint64_t;
+    /** Any thread; must not call back. */
     using Log = std::function<void(const std::string& line)>;
     /**
      * Told once that all tries for a subscription's destination have failed for as long as the subscription bears
@@ -104,7 +105,7 @@ class Delivery {
      * process delivers from it.
      */
     Delivery(const std::filesystem::path& database, const Options& options, PolicyHandler onPolicy, Log log);
-    ~Delivery(); ///< stops with no patience
+    ~Delivery(); ///< stops with no patience, and waits for a policy handler that runs
     Delivery(const Delivery&) = delete;
     Delivery& operator=(const Delivery&) = delete;
 
@@ -123,13 +124,14 @@ class Delivery {
 
     /**
      * Queues an indication once for each of the subscriptions, those that are not known left out. Returns at once;
-     * numbers and order are given here.
+     * numbers and order are given here. Throws NotKept after stop().
      */
     Ticket post(std::span<const std::string> subscriptions, const Instance& indication);
 
     /**
-     * Returns when all posts up to the ticket are on disk; whoever waits at the same time shares the cost. Throws
-     * NotKept when the disk did not take one of the last posts up to the ticket: those of the same write.
+     * Returns when the post is on disk: at once when a later one already is, so that whoever has several tickets
+     * waits for each, beginning with any. All who wait at the same time share the cost. Throws NotKept when the disk
+     * did not take it.
      */
     void wait(Ticket ticket);
 
@@ -140,7 +142,7 @@ class Delivery {
     void start();
 
     /**
-     * Posts from now on are refused with NotKept by wait(). What waits is sent for at most `patience`, then
+     * Posts from now on are refused. What waits is sent for at most `patience`, then
      * connections are cut; what is left stays on disk for the next start. Once.
      */
     void stop(std::chrono::milliseconds patience);
