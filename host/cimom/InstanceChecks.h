@@ -11,6 +11,7 @@
 #include <optional>
 #include <set>
 #include <string>
+#include <utility>
 
 namespace marlo {
 
@@ -34,12 +35,16 @@ class OnceLog {
 class InstanceChecks {
   public:
     /**
-     * `definition` is the class that the provider was asked for, `properties` what the client asked for; both outlive
-     * this, like all the rest.
+     * `definition` is the class that the provider was asked for; it outlives this, like all the rest but the
+     * provider's name.
      */
-    InstanceChecks(const Schema& schema, const std::string& nameSpace, const Class& definition,
-                   const std::string& provider, OnceLog& log)
-        : _schema(schema), _nameSpace(nameSpace), _definition(definition), _provider(provider), _log(log) {}
+    InstanceChecks(const Schema& schema, const std::string& nameSpace, const Class& definition, std::string provider,
+                   OnceLog& log)
+        : _schema(schema),
+          _nameSpace(nameSpace),
+          _definition(definition),
+          _provider(std::move(provider)),
+          _log(log) {}
 
     /**
      * The path with namespace and typed keys in the schema's order, without host. Nothing when it is not one of the
@@ -58,7 +63,7 @@ class InstanceChecks {
     const Schema& _schema;
     const std::string& _nameSpace;
     const Class& _definition;
-    const std::string& _provider;
+    const std::string _provider;
     OnceLog& _log;
     std::string _lastName; ///< the class name of the last answer and its definition: most answers are of one class
     const Class* _lastClass = nullptr;
