@@ -13,7 +13,7 @@ namespace marlo::cli {
 namespace {
 
 constexpr const char* Introduction =
-    "Shows and changes the network adapters of this host, and shows any object that its CIM providers serve.";
+    "Shows, changes and serves the network adapters of this host, and any other object that its CIM providers have.";
 
 constexpr const char* Conclusion = R"(Exit status: 0 answered, 1 the operation failed, 2 the command line is wrong.
 

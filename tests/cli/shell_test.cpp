@@ -60,6 +60,9 @@ TEST_F(MarloShell, PrintsACompletionScriptThatBashReads) {
 TEST_F(MarloShell, CompletesCommandsAndOptions) {
     EXPECT_THAT(complete("marlo a"), ElementsAre("adapters"));
     EXPECT_THAT(complete("marlo c"), ElementsAre("classes", "completion"));
+    EXPECT_THAT(complete("marlo se"), ElementsAre("set", "serve"));
+    EXPECT_THAT(complete("marlo serve --tri"), ElementsAre("--trial"));
+    EXPECT_THAT(complete("marlo serve --config ho"), ElementsAre("host.toml"));
     EXPECT_THAT(complete("marlo --v"), ElementsAre("--version"));
     EXPECT_THAT(complete("marlo enum --js"), ElementsAre("--json"));
     EXPECT_THAT(complete("marlo names --prop"), IsEmpty());
@@ -94,7 +97,7 @@ TEST_F(MarloShell, ShowsItsArgumentsByTheirNamesAlone) {
 
 TEST_F(MarloShell, ExplainsEveryCommandWithExamples) {
     for (const char* command : {"adapters", "enum", "names", "get", "invoke", "set", "static", "dhcp", "dns",
-                                "gateway", "restart", "watch", "classes", "completion"}) {
+                                "gateway", "restart", "watch", "classes", "serve", "status", "completion"}) {
         const Outcome outcome = marlo({command, "--help"});
         EXPECT_EQ(outcome.exitCode, 0) << command;
         EXPECT_EQ(outcome.err, "") << command;

@@ -175,6 +175,25 @@ TEST_F(ServerConfiguration, RefusesWhatDoesNotBelongWithFileLineKeyAndReason) {
     }
 }
 
+TEST_F(ServerConfiguration, IsShownByAnExampleThatSaysWhatHoldsAnyway) {
+    const Configuration example = readConfiguration(MARLO_EXAMPLE_CONFIGURATION);
+    const Configuration usual;
+    EXPECT_THAT(texts(example.listen.http), ElementsAre("127.0.0.1:5988", "[::1]:5988"));
+    EXPECT_THAT(texts(example.listen.https), ElementsAre("127.0.0.1:5989", "[::1]:5989"));
+    EXPECT_FALSE(example.listen.socket);
+    EXPECT_EQ(example.access.read, usual.access.read);
+    EXPECT_EQ(example.access.change, usual.access.change);
+    EXPECT_EQ(example.access.subscribe, usual.access.subscribe);
+    EXPECT_EQ(example.pamService, usual.pamService);
+    EXPECT_EQ(example.tls.certificateFile, "");
+    EXPECT_EQ(example.log.level, usual.log.level);
+    EXPECT_EQ(example.log.format, usual.log.format);
+    EXPECT_EQ(example.log.sink, usual.log.sink);
+    EXPECT_EQ(example.limits, usual.limits);
+    EXPECT_THAT(example.schema, IsEmpty());
+    EXPECT_THAT(example.providers, IsEmpty());
+}
+
 TEST_F(ServerConfiguration, MustBeThereWhereItIsNamed) {
     EXPECT_THROW(static_cast<void>(loadConfiguration(path("none.toml"))), std::system_error);
 }
