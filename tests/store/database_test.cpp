@@ -114,6 +114,13 @@ TEST_F(Store, KeepsNothingOfATransactionThatWasNotCommitted) {
     EXPECT_EQ(Database(file).query("SELECT count(*) FROM fruit").firstInteger(), 0);
 }
 
+TEST_F(Store, SynchronisesAtEachCommit) {
+    Database database(file);
+    EXPECT_EQ(database.query("PRAGMA synchronous").firstInteger(), 2); // FULL
+    EXPECT_EQ(database.query("PRAGMA journal_mode").firstText(), "wal");
+    EXPECT_EQ(database.query("PRAGMA foreign_keys").firstInteger(), 1);
+}
+
 TEST_F(Store, RunsOnlyTheStepsThatTheFileHasNotSeen) {
     Database(file).migrate("larder", firstSteps);
     Database(file).migrate("larder", bothSteps);
