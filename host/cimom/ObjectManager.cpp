@@ -143,6 +143,13 @@ void ObjectManager::add(std::shared_ptr<BuiltIn> builtIn) {
 
 Status ObjectManager::subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
                                 const IndicationSink& sink, SubscriptionId& id) {
+    return subscribe(
+        nameSpace, filter, language,
+        [sink](Instance&& indication, DeliveryRound& /*round*/) { sink(std::move(indication)); }, id);
+}
+
+Status ObjectManager::subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
+                                const RoundSink& sink, SubscriptionId& id) {
     id = 0;
     return runOperation(
         [&] { return _state->subscriptions.subscribe(spell(nameSpace), filter, language, sink, id); });

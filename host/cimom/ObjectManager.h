@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include "host/cimom/DeliveryRound.h"
 #include "host/cimom/ProviderHealth.h"
 #include "host/model/AssociationFilter.h"
 #include "host/model/Instance.h"
@@ -165,6 +166,9 @@ class ObjectManager {
 
     /** Receives an indication on the thread that delivers it; several at once when several deliver. */
     using IndicationSink = std::function<void(Instance&& indication)>;
+    /** The same, with work left for later (DeliveryRound.h), which may be done after an unsubscribing has returned.
+     */
+    using RoundSink = std::function<void(Instance&& indication, DeliveryRound& round)>;
 
     /**
      * Subscribes to the indications of a filter (host/filter/Filter.h) in "WQL" or "CQL" and gives the subscription's
@@ -178,6 +182,8 @@ class ObjectManager {
      */
     Status subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
                      const IndicationSink& sink, SubscriptionId& id);
+    Status subscribe(const std::string& nameSpace, const std::string& filter, const std::string& language,
+                     const RoundSink& sink, SubscriptionId& id);
 
     /**
      * Ends a subscription whatever its providers answer; the first failure is answered. The sink is not called any

@@ -52,7 +52,7 @@ class Subscription::Delivery {
 thread_local const Subscription::Delivery* Subscription::Delivery::innermost = nullptr;
 
 Subscription::Subscription(const broker::Broker& broker, filter::Filter filter, std::string nameSpace,
-                           std::string fromClass, ObjectManager::IndicationSink sink)
+                           std::string fromClass, ObjectManager::RoundSink sink)
     : _filter(std::move(filter)),
       _nameSpace(std::move(nameSpace)),
       _fromClass(std::move(fromClass)),
@@ -72,7 +72,7 @@ bool Subscription::wants(const Instance& indication, const broker::SchemaView& s
            _filter.matches(broker::InstanceSubject(indication, schema));
 }
 
-void Subscription::deliver(const Instance& indication) {
+void Subscription::deliver(const Instance& indication, DeliveryRound& round) {
     const Delivery delivery(*this);
     if (!delivery.isOpen()) {
         return;
@@ -87,7 +87,7 @@ void Subscription::deliver(const Instance& indication) {
             copy.properties.push_back(property);
         }
     }
-    _sink(std::move(copy));
+    _sink(std::move(copy), round);
 }
 
 void Subscription::close() {

@@ -26,7 +26,7 @@ class Subscription {
     };
 
     Subscription(const broker::Broker& broker, filter::Filter filter, std::string nameSpace, std::string fromClass,
-                 ObjectManager::IndicationSink sink);
+                 ObjectManager::RoundSink sink);
     ~Subscription() = default;
     Subscription(const Subscription&) = delete;
     Subscription& operator=(const Subscription&) = delete;
@@ -42,7 +42,7 @@ class Subscription {
     [[nodiscard]] bool wants(const Instance& indication, const broker::SchemaView& schema) const;
 
     /** Hands a copy, cut to the selected properties, to the sink; throws what the sink throws. */
-    void deliver(const Instance& indication);
+    void deliver(const Instance& indication, DeliveryRound& round);
 
     /**
      * From now on nothing is delivered; waits until no sink runs on other threads. One that runs on this thread is
@@ -65,7 +65,7 @@ class Subscription {
     const filter::Filter _filter;
     const std::string _nameSpace;
     const std::string _fromClass;
-    const ObjectManager::IndicationSink _sink;
+    const ObjectManager::RoundSink _sink;
     const std::unique_ptr<CMPISelectExp, Release> _filterHandle;
     std::mutex _mutex; ///< guards all below
     std::condition_variable _sinkReturned;

@@ -17,6 +17,17 @@ std::string indicationFault(const Class& definition) {
     return definition.isIndication ? "" : definition.name + " is not a class of indications";
 }
 
+/** One step of a delivery, which does not keep the others from being done; the last failure is the outcome. */
+template <typename Step>
+void attempt(const Step& step, OnceLog& log, broker::Outcome& outcome) {
+    try {
+        step();
+    } catch (...) {
+        outcome = {CMPI_RC_ERR_FAILED, "a subscriber threw: " + currentExceptionText()};
+        log.say(outcome.message);
+    }
+}
+
 } // namespace
 
 /** Holds the right to tell providers. Refused to a sink that runs below such a call on the same thread. */
@@ -75,7 +86,7 @@ Subscriptions::Entry Subscriptions::remove(SubscriptionId id) {
 
 Subscriptions::Entry Subscriptions::makeEntry(const std::string& nameSpace, const std::string& text,
                                               const std::string& language,
-                                              const ObjectManager::IndicationSink& sink) const {
+                                              const ObjectManager::RoundSink& sink) const {
     filter::Filter filter = readQuery(_schema, nameSpace, text, language, "the filter");
     const Class& definition = *_schema.findClass(nameSpace, filter.className());
     if (const std::string fault = indicationFault(definition); !fault.empty()) {
@@ -174,7 +185,7 @@ Status Subscriptions::deactivateAll(Subscription& entry) {
 }
 
 Status Subscriptions::subscribe(const std::string& nameSpace, const std::string& text, const std::string& language,
-                                const ObjectManager::IndicationSink& sink, SubscriptionId& id) {
+                                const ObjectManager::RoundSink& sink, SubscriptionId& id) {
     id = 0;
     const Entry entry = makeEntry(nameSpace, text, language, sink);
     const auto services = servicesOf(*entry);
@@ -271,15 +282,17 @@ broker::Outcome Subscriptions::deliver(const std::string& nameSpace, Instance&& 
         return outcome;
     }
     const auto subscribed = list(); // held, as others may unsubscribe meanwhile
-    for (const auto& [id, entry] : *subscribed) {
-        try {
-            if (entry->wants(*checked, _knowledge)) {
-                entry->deliver(*checked);
+    DeliveryRound round;
+    for (const auto& each : *subscribed) {
+        const auto hand = [&] {
+            if (each.second->wants(*checked, _knowledge)) {
+                each.second->deliver(*checked, round);
             }
-        } catch (...) {
-            outcome = {CMPI_RC_ERR_FAILED, "a subscriber threw: " + currentExceptionText()};
-            _log.say(outcome.message);
-        }
+        };
+        attempt(hand, _log, outcome);
+    }
+    for (const auto& each : round._works) {
+        attempt(each.second, _log, outcome);
     }
     return outcome;
 }

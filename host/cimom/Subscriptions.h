@@ -40,7 +40,7 @@ class Subscriptions {
 
     /** As ObjectManager::subscribe, the namespace spelled as the schema has it; throws RequestError. */
     Status subscribe(const std::string& nameSpace, const std::string& text, const std::string& language,
-                     const ObjectManager::IndicationSink& sink, SubscriptionId& id);
+                     const ObjectManager::RoundSink& sink, SubscriptionId& id);
     Status unsubscribe(SubscriptionId id);
 
     /** Ends all subscriptions; deliveries and subscriptions from now on are refused. */
@@ -60,7 +60,7 @@ class Subscriptions {
     void add(SubscriptionId id, const Entry& entry);
     Entry remove(SubscriptionId id);
     Entry makeEntry(const std::string& nameSpace, const std::string& text, const std::string& language,
-                    const ObjectManager::IndicationSink& sink) const;
+                    const ObjectManager::RoundSink& sink) const;
     std::vector<Subscription::Activation> servicesOf(const Subscription& entry) const;
     Status activate(Subscription& entry, const Subscription::Activation& activation);
     Status deactivate(const Subscription& entry, const Subscription::Activation& activation);

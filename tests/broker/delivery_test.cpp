@@ -136,6 +136,38 @@ TEST_F(DeliveryTest, TellsTheProviderWhenASubscriberThrowsAndServesTheOthers) {
     EXPECT_THAT(site.lines(), ElementsAre("a subscriber threw: full"));
 }
 
+TEST_F(DeliveryTest, DoesWhatSinksLeaveOnceBehindThemAll) {
+    std::vector<std::string> steps;
+    const auto sinkOf = [&steps](const std::string& name, const void* owner) {
+        return [&steps, name, owner](Instance&&, DeliveryRound& round) {
+            steps.push_back(name);
+            round.afterwards(owner, [&steps, name] { steps.push_back("after " + name); });
+        };
+    };
+    const int one = 0;
+    const int other = 0;
+    SubscriptionId id = 0;
+    ASSERT_TRUE(manager->subscribe("root/test", allAlerts, "WQL", sinkOf("first", &one), id).ok());
+    ASSERT_TRUE(manager->subscribe("root/test", allAlerts, "WQL", sinkOf("second", &other), id).ok());
+    ASSERT_TRUE(manager->subscribe("root/test", allAlerts, "WQL", sinkOf("third", &one), id).ok());
+    EXPECT_EQ(deliver("root/test", "Test_Alert", 1, ""), CMPI_RC_OK);
+    EXPECT_THAT(steps, ElementsAre("first", "second", "third", "after third", "after second"));
+}
+
+TEST_F(DeliveryTest, TellsTheProviderWhenWhatWasLeftFails) {
+    SubscriptionId id = 0;
+    int done = 0;
+    const auto full = [](Instance&&, DeliveryRound& round) {
+        round.afterwards(&round, [] { throw std::runtime_error("no room"); });
+    };
+    const auto fine = [&done](Instance&&, DeliveryRound& round) { round.afterwards(&done, [&done] { ++done; }); };
+    ASSERT_TRUE(manager->subscribe("root/test", allAlerts, "WQL", full, id).ok());
+    ASSERT_TRUE(manager->subscribe("root/test", allAlerts, "WQL", fine, id).ok());
+    EXPECT_EQ(deliver("root/test", "Test_Alert", 1, ""), CMPI_RC_ERR_FAILED);
+    EXPECT_EQ(done, 1);
+    EXPECT_THAT(site.lines(), ElementsAre("a subscriber threw: no room"));
+}
+
 TEST_F(DeliveryTest, EndsBeforeUnsubscribingReturns) {
     std::atomic<bool> entered{false};
     std::atomic<bool> left{false};
