@@ -35,6 +35,16 @@ std::string spellPathNameSpace(const Schema& schema, const std::string& nameSpac
     return spelled;
 }
 
+/** wbemcli writes a reference's namespace, and a host before that, into the name of its class. */
+ObjectPath withPlainClassName(ObjectPath path) {
+    const auto colon = path.className.rfind(':');
+    if (colon != std::string::npos) {
+        path.nameSpace = path.className.substr(0, colon);
+        path.className.erase(0, colon + 1);
+    }
+    return path;
+}
+
 } // namespace
 
 std::string spellNameSpace(const Schema& schema, std::string_view nameSpace) {
@@ -46,7 +56,8 @@ std::string spellNameSpace(const Schema& schema, std::string_view nameSpace) {
     return known == nullptr ? std::string(name) : *known;
 }
 
-ObjectPath spellPath(const Schema& schema, const std::string& nameSpace, const ObjectPath& path) {
+ObjectPath spellPath(const Schema& schema, const std::string& nameSpace, const ObjectPath& written) {
+    const ObjectPath path = withPlainClassName(written);
     ObjectPath spelled{
         "", path.nameSpace.empty() ? nameSpace : spellPathNameSpace(schema, path.nameSpace), path.className, {}};
     const Class* definition = schema.findClass(spelled.nameSpace, path.className);

@@ -22,7 +22,8 @@ std::string spellNameSpace(const Schema& schema, std::string_view nameSpace);
 /**
  * A path as the schema has it: namespace (`nameSpace` where it has none), class and keys spelled, keys typed and in
  * order. The host is dropped, since all that this object manager knows of is on its own; so is one that stands
- * before the namespace without slashes of its own. What the schema does not know, stays as it is.
+ * before the namespace without slashes of its own, and both may stand in the name of the class. What the schema does
+ * not know, stays as it is.
  */
 ObjectPath spellPath(const Schema& schema, const std::string& nameSpace, const ObjectPath& path);
 

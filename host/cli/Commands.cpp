@@ -227,6 +227,9 @@ ExitCode run(ObjectManager& manager, const Options& given, Output& output) {
         return runClasses(manager, options, output);
     case Command::Serve:
     case Command::Status:
+    case Command::Subscribe:
+    case Command::Subscriptions:
+    case Command::Unsubscribe:
     case Command::Completion:
         break; // run without the object manager that the others share
     }

@@ -35,7 +35,7 @@ _marlo_arguments() {
         case "${COMP_WORDS[i]}" in
         "$1") seen=1 ;;
         -n | --namespace | --tree | --agent-config | --schema | --providers | --libraries | --*-level | --*-sink) ((++i)) ;;
-        --config | --socket | --http | --https | --mask | --gateway | --server | --search | --domain | -p | --property) ((++i)) ;;
+        --config | --socket | --http | --https | --filter | --language | --mask | --gateway | --server | --search | --domain | -p | --property) ((++i)) ;;
         -*) ;;
         *) ((count += seen)) ;;
         esac
@@ -82,6 +82,14 @@ constexpr const char* ScriptTail = R"bash(
     case "$subcommand" in
     enum | names | watch)
         mapfile -t COMPREPLY < <(compgen -W "$(_marlo_classes "${COMP_WORDS[0]}")" -- "$current")
+        ;;
+    subscribe)
+        [[ "$(_marlo_arguments subscribe)" == 0 ]] ||
+            mapfile -t COMPREPLY < <(compgen -W "$(_marlo_classes "${COMP_WORDS[0]}")" -- "$current")
+        ;;
+    unsubscribe)
+        mapfile -t COMPREPLY < <(compgen -W "$("${COMP_WORDS[0]}" subscriptions 2>/dev/null |
+            awk 'NR > 1 && $1 ~ /^marlo/ { print $1 }' | sort -u)" -- "$current")
         ;;
     get)
         mapfile -t COMPREPLY < <(compgen -S . -W "$(_marlo_classes "${COMP_WORDS[0]}")" -- "$current")

@@ -24,8 +24,15 @@ void addAgentOptions(CLI::App& app, AgentOptions& agent);
 void addDirectoryOptions(CLI::App& app, DirectoryOptions& directories);
 void addNameSpace(CLI::App& app, Options& options);
 
+/** The server to be asked: its configuration, or the socket itself. */
+void addConfiguration(CLI::App& app, ServerOptions& server);
+void addSocket(CLI::App& app, ServerOptions& server, const std::string& text);
+
 /** The commands that change an adapter or the host. */
 void addChangeCommands(CLI::App& app, Options& options);
+
+/** `subscribe`, `subscriptions` and `unsubscribe`. */
+void addSubscriptionCommands(CLI::App& app, Options& options);
 
 /** `serve` and `status`. */
 void addServerCommands(CLI::App& app, Options& options);

@@ -122,7 +122,7 @@ void addWatchCommand(CLI::App& app, Options& options) {
     addDirectoryOptions(command, options.directories);
 }
 
-/** Puts the indications of adapters where nothing is named. */
+/** Puts the indications of adapters where nothing is named, to watch or to subscribe to. */
 void completeWatch(WatchOptions& watch) {
     if (!watch.filter.empty() && !watch.classes.empty()) {
         throw UsageError("--filter names its class itself: it goes with no CLASS");
@@ -179,6 +179,7 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     addChangeCommands(app, line.options);
     addWatchCommand(app, line.options);
     addServerCommands(app, line.options);
+    addSubscriptionCommands(app, line.options);
     addOtherCommands(app, line.options);
     try {
         app.parse(argc, argv);
@@ -192,7 +193,8 @@ CommandLine readCommandLine(int argc, const char* const* argv) {
     } catch (const CLI::ParseError& error) {
         throw UsageError(error.what());
     }
-    if (line.options.command == Command::Watch) {
+    const Command command = line.options.command;
+    if (command == Command::Watch || command == Command::Subscribe) {
         completeWatch(line.options.watch);
     }
     if (line.options.command == Command::Completion) {

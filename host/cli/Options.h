@@ -33,6 +33,9 @@ enum class Command {
     Classes,
     Serve,
     Status,
+    Subscribe,
+    Subscriptions,
+    Unsubscribe,
     Completion
 };
 
@@ -88,7 +91,8 @@ struct Options {
     std::vector<std::string> properties; ///< none: all
     bool json = false;
     bool namesOnly = false;
-    WatchOptions watch;
+    WatchOptions watch; ///< of subscriptions too: what to subscribe to
+    bool all = false;
     ServerOptions server;
     AgentOptions agent;
     DirectoryOptions directories;

@@ -29,15 +29,6 @@ Examples:
 
 constexpr const char* ListeningGroup = "Where it listens";
 
-void addConfiguration(CLI::App& app, ServerOptions& server) {
-    app.add_option("--config", server.configurationFile, "The server's configuration, for /etc/marlo/server.toml")
-        ->type_name("FILE");
-}
-
-void addSocket(CLI::App& app, ServerOptions& server, const std::string& text) {
-    app.add_option("--socket", server.socket, text)->type_name("PATH")->group(ListeningGroup);
-}
-
 void addListeners(CLI::App& app, const std::string& name, std::optional<std::vector<std::string>>& addresses,
                   const std::string& text) {
     app.add_option(name, addresses, text)
@@ -56,6 +47,15 @@ void addSite(CLI::App& app, const std::string& name, std::vector<std::string>& d
 }
 
 } // namespace
+
+void addConfiguration(CLI::App& app, ServerOptions& server) {
+    app.add_option("--config", server.configurationFile, "The server's configuration, for /etc/marlo/server.toml")
+        ->type_name("FILE");
+}
+
+void addSocket(CLI::App& app, ServerOptions& server, const std::string& text) {
+    app.add_option("--socket", server.socket, text)->type_name("PATH")->group(ListeningGroup);
+}
 
 void addServerCommands(CLI::App& app, Options& options) {
     ServerOptions& server = options.server;

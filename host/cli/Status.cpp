@@ -84,6 +84,23 @@ std::string showProviders(const server::StatusReport& report, std::size_t width,
     return table.render(width, colours);
 }
 
+std::string showDeliveries(const server::StatusReport& report, std::size_t width, bool colours) {
+    Table table({"LISTENER", "URL", "QUEUED", "SENT", "RETRIED", "DROPPED", "MEDIAN", "99 OF 100", "LAST ERROR"});
+    for (const server::DeliveryState& each : report.deliveries) {
+        const Style style = each.failingSince != 0 || each.dropped != 0 ? Style::Bad : Style::Plain;
+        table.add({{{makePrintable(each.destination)}, {}},
+                   {{makePrintable(each.url)}, {}},
+                   {{std::to_string(each.queued)}, {}},
+                   {{std::to_string(each.sent)}, Style::Good},
+                   {{std::to_string(each.retried)}, {}},
+                   {{std::to_string(each.dropped)}, each.dropped != 0 ? Style::Bad : Style::Plain},
+                   {{showMicroseconds(each.latency.median)}, {}},
+                   {{showMicroseconds(each.latency.high)}, {}},
+                   {{each.lastError.empty() ? "-" : makePrintable(each.lastError)}, style}});
+    }
+    return table.render(width, colours);
+}
+
 std::string showRequests(const server::StatusReport& report, std::size_t width, bool colours) {
     Table table({"OPERATION", "RESULT", "COUNT"});
     for (const server::RequestCount& each : report.requests) {
@@ -92,19 +109,6 @@ std::string showRequests(const server::StatusReport& report, std::size_t width, 
                    {{std::to_string(each.count)}, {}}});
     }
     return table.render(width, colours);
-}
-
-/** The socket that was named, or that the configuration says, or the usual one. */
-std::string findSocket(const ServerOptions& options) {
-    if (options.socket) {
-        return *options.socket;
-    }
-    const server::Configuration configuration = server::loadConfiguration(options.configurationFile);
-    const std::string socket = configuration.listen.socket.value_or(server::usualPlaces().socket);
-    if (socket.empty()) {
-        throw server::NotRunning("there is no socket to ask at: name it with --socket");
-    }
-    return socket;
 }
 
 server::LocalAnswer ask(const std::string& socket) {
@@ -118,10 +122,25 @@ server::LocalAnswer ask(const std::string& socket) {
 
 } // namespace
 
+std::string findSocket(const ServerOptions& options) {
+    if (options.socket) {
+        return *options.socket;
+    }
+    const server::Configuration configuration = server::loadConfiguration(options.configurationFile);
+    const std::string socket = configuration.listen.socket.value_or(server::usualPlaces().socket);
+    if (socket.empty()) {
+        throw server::NotRunning("there is no socket to ask at: name it with --socket");
+    }
+    return socket;
+}
+
 std::string showStatus(const server::StatusReport& report, std::size_t width, bool colours) {
     std::string text = showFacts(report, width, colours);
     if (!report.providers.empty()) {
         text += "\n" + showProviders(report, width, colours);
+    }
+    if (!report.deliveries.empty()) {
+        text += "\n" + showDeliveries(report, width, colours);
     }
     if (!report.requests.empty()) {
         text += "\n" + showRequests(report, width, colours);

@@ -19,4 +19,7 @@ ExitCode runStatus(const Options& options, Output& output);
 /** The report as people read it. */
 std::string showStatus(const server::StatusReport& report, std::size_t width, bool colours);
 
+/** The socket that was named, or that the configuration says, or the usual one; throws server::NotRunning. */
+std::string findSocket(const ServerOptions& options);
+
 } // namespace marlo::cli

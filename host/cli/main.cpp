@@ -4,6 +4,7 @@
 #include "host/cli/Output.h"
 #include "host/cli/Serve.h"
 #include "host/cli/Status.h"
+#include "host/cli/Subscribe.h"
 
 #include <exception>
 
@@ -21,6 +22,9 @@ ExitCode runCommandLine(int argc, const char* const* argv) {
     }
     if (line.options.command == Command::Status) {
         return runStatus(line.options, output);
+    }
+    if (isAboutSubscriptions(line.options.command)) {
+        return runSubscriptions(line.options, output);
     }
     tellAgent(line.options.agent);
     if (line.options.command == Command::Serve) {

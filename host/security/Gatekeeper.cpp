@@ -237,6 +237,13 @@ Admission Gatekeeper::admit(const http::RequestHead& head, const http::Peer& pee
     }
 }
 
+bool Gatekeeper::may(const std::string& user, Role role) const {
+    const bool mayEverything = (!_state->trialUser.empty() && user == _state->trialUser) ||
+                               user == _state->localIdentity(0).name() ||
+                               user == _state->localIdentity(_state->ownUser).name();
+    return mayEverything || _state->currentAccess()->identityOf(user).may(role);
+}
+
 void Gatekeeper::setAccess(const Access& access) {
     auto list = std::make_shared<const AccessList>(access);
     const std::lock_guard<std::mutex> lock(_state->accessMutex);

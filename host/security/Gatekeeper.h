@@ -81,6 +81,9 @@ class Gatekeeper {
     /** Refusals of whoever brought something are logged, with peer and user. */
     [[nodiscard]] Admission admit(const http::RequestHead& head, const http::Peer& peer);
 
+    /** Whether a user who was admitted, by this name, at some time or other has a role now. */
+    [[nodiscard]] bool may(const std::string& user, Role role) const;
+
     /** Other users from now on. Throws as the constructor does, and keeps what it had. */
     void setAccess(const Access& access);
 

@@ -36,6 +36,7 @@ class FileReader {
         inTable(reader, "access", [this](TomlReader& table) { readAccess(table); });
         inTable(reader, "tls", [this](TomlReader& table) { readTls(table); });
         inTable(reader, "directories", [this](TomlReader& table) { readDirectories(table); });
+        inTable(reader, "indications", [this](TomlReader& table) { readIndications(table); });
         inTable(reader, "log", [this](TomlReader& table) { readLog(table); });
         inTable(reader, "limits", [this](TomlReader& table) { readLimits(table); });
         reader.refuseOtherKeys();
@@ -135,6 +136,21 @@ class FileReader {
         readPaths(reader, "schema", _configuration.schema);
         readPaths(reader, "providers", _configuration.providers);
         readPath(reader, "state", _configuration.stateDirectory);
+    }
+
+    void readIndications(TomlReader& reader) {
+        IndicationOptions& indications = _configuration.indications;
+        constexpr std::uint64_t longestQueue = 10'000'000;
+        constexpr std::uint64_t leastBytes = 65536;
+        constexpr std::uint64_t mostBytes = std::uint64_t{1} << 40U;
+        readPath(reader, "authorities", indications.authorityFile);
+        if (std::error_code ignored;
+            !indications.authorityFile.empty() && !fs::is_regular_file(indications.authorityFile, ignored)) {
+            reader.refuseKey("authorities", indications.authorityFile + " is no file");
+        }
+        indications.unverified = reader.texts("unverified").value_or(indications.unverified);
+        readLimit(reader, "queue_length", indications.queueLength, 1, longestQueue);
+        readLimit(reader, "queue_bytes", indications.queueBytes, leastBytes, mostBytes);
     }
 
     void readLog(TomlReader& reader) {

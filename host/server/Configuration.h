@@ -21,6 +21,15 @@ struct Listening {
     std::optional<std::string> socket; ///< path of the Unix domain socket; empty: none
 };
 
+/** How indications go to their listeners. */
+struct IndicationOptions {
+    std::string authorityFile;                               ///< for listeners with https; empty: the system's
+    std::vector<std::string> unverified;                     ///< hosts whose certificates are not looked at
+    std::size_t queueLength = 100000;                        ///< of one listener
+    std::size_t queueBytes = std::size_t{256} * 1024 * 1024; ///< the same
+    bool operator==(const IndicationOptions&) const = default;
+};
+
 struct Configuration {
     std::string file; ///< that it was read from; empty: there is none
     Listening listen;
@@ -30,6 +39,7 @@ struct Configuration {
     std::vector<std::string> schema;    ///< directories of the site, on top of the shipped one
     std::vector<std::string> providers; ///< the same
     std::string stateDirectory;         ///< empty: the usual one
+    IndicationOptions indications;
     LogOptions log;
     http::Limits limits;
 };

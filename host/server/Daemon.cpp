@@ -4,6 +4,7 @@
 #include "host/security/Privileges.h"
 #include "host/server/Endpoints.h"
 #include "host/server/Health.h"
+#include "host/server/Indications.h"
 #include "host/server/Listeners.h"
 #include "host/server/Notify.h"
 #include "host/server/RequestLog.h"
@@ -27,6 +28,9 @@ namespace {
 
 constexpr const char* TrialUser = "marlo";
 
+/** How long indications that wait may go on being sent at the end; the others go out after the next start. */
+constexpr std::chrono::seconds IndicationPatience(2);
+
 std::string hostName() {
     constexpr std::size_t longest = 256;
     std::array<char, longest> name{};
@@ -38,13 +42,15 @@ bool usesTls(const std::vector<http::Endpoint>& endpoints) {
                        [](const http::Endpoint& each) { return each.transport == http::Transport::tls; });
 }
 
+std::string stateDirectoryOf(const Configuration& configuration) {
+    return configuration.stateDirectory.empty() ? usualPlaces().state : configuration.stateDirectory;
+}
+
 /** The files of the configuration, or the server's own, which are made where they are missing. */
 http::TlsOptions findCertificate(const Configuration& configuration) {
     http::TlsOptions tls = configuration.tls;
     if (tls.certificateFile.empty()) {
-        const std::string state =
-            configuration.stateDirectory.empty() ? usualPlaces().state : configuration.stateDirectory;
-        const security::CertificateFiles files = security::ownCertificate(state).files;
+        const security::CertificateFiles files = security::ownCertificate(stateDirectoryOf(configuration)).files;
         tls.certificateFile = files.certificate;
         tls.keyFile = files.key;
     } else {
@@ -83,6 +89,8 @@ std::string changedForNextStart(const Configuration& before, const Configuration
     compare("access.pam_service", before.pamService == now.pamService);
     compare("directories", before.schema == now.schema && before.providers == now.providers &&
                                before.stateDirectory == now.stateDirectory);
+    compare("indications.queue_length", before.indications.queueLength == now.indications.queueLength);
+    compare("indications.queue_bytes", before.indications.queueBytes == now.indications.queueBytes);
     compare("limits", before.limits == now.limits);
     return names;
 }
@@ -94,6 +102,7 @@ struct Daemon::State {
 
     security::GatekeeperOptions gatekeeperOptions();
     wbem::ServiceOptions serviceOptions();
+    void startIndications();
     std::function<void(const std::string&)> logTo(const char* event);
     http::Answer answerStatus();
     void reload();
@@ -112,6 +121,8 @@ struct Daemon::State {
     std::optional<http::TlsOptions> tls;
     std::optional<security::Gatekeeper> gatekeeper;
     std::optional<ObjectManager> manager;
+    std::string whyNoIndications;
+    std::optional<Indications> indications;
     std::optional<wbem::Service> service;
     std::optional<http::Server> server;
     std::atomic<bool> isComplete{false}; ///< requests come as soon as the server listens
@@ -131,6 +142,7 @@ Daemon::State::State(DaemonOptions&& given)
     log.write(LogLevel::info, "start", security::dropPrivileges()); // the first thread is started below
     gatekeeper.emplace(gatekeeperOptions(), logTo("access"));
     manager.emplace(completed(options.objectManager, configuration, log));
+    startIndications();
     service.emplace(*manager, serviceOptions());
     server.emplace(*service, listeners.endpoints, tls, configuration.limits, logTo("http"));
     announcement.endpoints = server->endpoints();
@@ -172,6 +184,25 @@ wbem::ServiceOptions Daemon::State::serviceOptions() {
     return wbem;
 }
 
+/** A server on trial does without, since another one may be using the database. */
+void Daemon::State::startIndications() {
+    Indications::Options indicationOptions;
+    indicationOptions.stateDirectory = stateDirectoryOf(configuration);
+    indicationOptions.mayRead = [this](const std::string& user) {
+        return gatekeeper->may(user, security::Role::read);
+    };
+    indicationOptions.log = logTo("indication");
+    try {
+        indications.emplace(*manager, configuration.indications, indicationOptions);
+    } catch (const std::exception& error) {
+        if (!options.trial) {
+            throw;
+        }
+        whyNoIndications = std::string("nobody can subscribe: ") + error.what();
+        announcement.notes.push_back(whyNoIndications);
+    }
+}
+
 std::function<void(const std::string&)> Daemon::State::logTo(const char* event) {
     return [this, event](const std::string& line) { log.write(LogLevel::warning, event, line); };
 }
@@ -195,6 +226,11 @@ http::Answer Daemon::State::answerStatus() {
         report.providers.push_back({each.name, each.library, state, each.failure});
     }
     report.openEnumerations = service->openEnumerations();
+    if (indications) {
+        report.deliveries = indications->deliveries();
+    } else {
+        report.reasons.push_back(whyNoIndications);
+    }
     report.residentBytes = residentBytes();
     report.lostLogLines = log.lost();
     health.complete(report, log.isFailing(), configuration.limits.workers);
@@ -213,6 +249,9 @@ void Daemon::State::takeConfiguration(const Configuration& fresh) {
     if (freshTls) {
         server->reloadTls(*freshTls);
         tls = freshTls;
+    }
+    if (indications) {
+        indications->configure(fresh.indications);
     }
     log.reopen(fresh.log);
     if (const std::string names = changedForNextStart(configuration, fresh); !names.empty()) {
@@ -238,6 +277,9 @@ bool Daemon::State::stop() {
     notifyManager("STOPPING=1");
     log.write(LogLevel::info, "stop", "no new requests; " + std::to_string(server->counters().busy) + " under way");
     const bool whole = stopServer(*server, signals, log);
+    if (indications) {
+        indications->stop(IndicationPatience);
+    }
     log.write(LogLevel::info, "stop", "ended");
     return whole;
 }

@@ -4,7 +4,7 @@
 #include <boost/asio/local/stream_protocol.hpp>
 #include <boost/beast/core/basic_stream.hpp>
 #include <boost/beast/core/flat_buffer.hpp>
-#include <boost/beast/http/empty_body.hpp>
+#include <boost/beast/http/parser.hpp>
 #include <boost/beast/http/read.hpp>
 #include <boost/beast/http/string_body.hpp>
 #include <boost/beast/http/write.hpp>
@@ -17,14 +17,20 @@ namespace asio = boost::asio;
 namespace beast = boost::beast;
 using Error = boost::system::error_code;
 
+constexpr unsigned httpVersion = 11;
+constexpr std::uint64_t longestAnswer = std::uint64_t{256} * 1024 * 1024;
+
 /** One request and its answer; asynchronous, since only then there is a time-out. */
 class Exchange {
   public:
-    Exchange(const std::string& socket, const std::string& path) : _stream(_context), _socket(socket) {
-        _request.method(beast::http::verb::get);
-        _request.target(path);
+    using Request = beast::http::request<beast::http::string_body>;
+
+    Exchange(const std::string& socket, Request request)
+        : _stream(_context), _socket(socket), _request(std::move(request)) {
         _request.set(beast::http::field::host, "localhost");
         _request.keep_alive(false);
+        _request.prepare_payload();
+        _response.body_limit(longestAnswer);
     }
 
     LocalAnswer run(std::chrono::milliseconds patience) {
@@ -34,7 +40,7 @@ class Exchange {
         if (_error) {
             throw NotRunning(_socket + ": " + _error.message());
         }
-        return {_response.result_int(), _response.body()};
+        return {_response.get().result_int(), _response.get().body()};
     }
 
   private:
@@ -63,19 +69,33 @@ class Exchange {
     Stream _stream;
     std::string _socket;
     beast::flat_buffer _buffer;
-    beast::http::request<beast::http::empty_body> _request;
-    beast::http::response<beast::http::string_body> _response;
+    Request _request;
+    beast::http::response_parser<beast::http::string_body> _response;
     Error _error;
 };
+
+LocalAnswer exchange(const std::string& socket, Exchange::Request request, std::chrono::milliseconds patience) {
+    try {
+        return Exchange(socket, std::move(request)).run(patience);
+    } catch (const boost::system::system_error& error) { // a path that is too long, for instance
+        throw NotRunning(socket + ": " + error.what());
+    }
+}
 
 } // namespace
 
 LocalAnswer askLocally(const std::string& socket, const std::string& path, std::chrono::milliseconds patience) {
-    try {
-        return Exchange(socket, path).run(patience);
-    } catch (const boost::system::system_error& error) { // a path that is too long, for instance
-        throw NotRunning(socket + ": " + error.what());
-    }
+    return exchange(socket, Exchange::Request(beast::http::verb::get, path, httpVersion), patience);
+}
+
+LocalAnswer operateLocally(const std::string& socket, const std::string& method, const std::string& nameSpace,
+                           const std::string& document, std::chrono::milliseconds patience) {
+    Exchange::Request request(beast::http::verb::post, "/cimom", httpVersion, document);
+    request.set(beast::http::field::content_type, "application/xml; charset=\"utf-8\"");
+    request.set("CIMOperation", "MethodCall");
+    request.set("CIMMethod", method);
+    request.set("CIMObject", nameSpace);
+    return exchange(socket, std::move(request), patience);
 }
 
 } // namespace marlo::server

@@ -27,4 +27,8 @@ struct LocalAnswer {
  */
 LocalAnswer askLocally(const std::string& socket, const std::string& path, std::chrono::milliseconds patience);
 
+/** POSTs a CIM operation (DSP0200) to the server behind a socket; throws as askLocally does. */
+LocalAnswer operateLocally(const std::string& socket, const std::string& method, const std::string& nameSpace,
+                           const std::string& document, std::chrono::milliseconds patience);
+
 } // namespace marlo::server

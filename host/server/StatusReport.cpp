@@ -29,6 +29,39 @@ Json providersJson(const std::vector<ProviderState>& providers) {
     return list;
 }
 
+Json deliveriesJson(const std::vector<DeliveryState>& deliveries) {
+    Json list = Json::array();
+    for (const DeliveryState& each : deliveries) {
+        list.push_back({{"destination", each.destination},
+                        {"url", each.url},
+                        {"queued", each.queued},
+                        {"queued_bytes", each.queuedBytes},
+                        {"sent", each.sent},
+                        {"retried", each.retried},
+                        {"dropped", each.dropped},
+                        {"last_error", each.lastError},
+                        {"failing_since", each.failingSince},
+                        {"latency_us", {{"median", each.latency.median}, {"p99", each.latency.high}}}});
+    }
+    return list;
+}
+
+DeliveryState readDelivery(const Json& json) {
+    DeliveryState state;
+    state.destination = json.at("destination");
+    state.url = json.at("url");
+    state.queued = json.at("queued");
+    state.queuedBytes = json.at("queued_bytes");
+    state.sent = json.at("sent");
+    state.retried = json.at("retried");
+    state.dropped = json.at("dropped");
+    state.lastError = json.at("last_error");
+    state.failingSince = json.at("failing_since");
+    state.latency.median = json.at("latency_us").at("median");
+    state.latency.high = json.at("latency_us").at("p99");
+    return state;
+}
+
 } // namespace
 
 std::string toJson(const StatusReport& report) {
@@ -52,6 +85,7 @@ std::string toJson(const StatusReport& report) {
          {{"median", report.latency.median}, {"p99", report.latency.high}, {"highest", report.latency.highest}}},
         {"open_enumerations", report.openEnumerations},
         {"providers", providersJson(report.providers)},
+        {"deliveries", deliveriesJson(report.deliveries)},
         {"resident_bytes", report.residentBytes},
         {"lost_log_lines", report.lostLogLines},
     };
@@ -82,6 +116,9 @@ StatusReport parseStatusReport(const std::string& text) {
         report.openEnumerations = json.at("open_enumerations");
         for (const Json& each : json.at("providers")) {
             report.providers.push_back({each.at("name"), each.at("library"), each.at("state"), each.at("failure")});
+        }
+        for (const Json& each : json.at("deliveries")) {
+            report.deliveries.push_back(readDelivery(each));
         }
         report.residentBytes = json.at("resident_bytes");
         report.lostLogLines = json.at("lost_log_lines");

@@ -20,6 +20,20 @@ struct ProviderState {
     std::string failure; ///< the latest reason why it could not be loaded
 };
 
+/** What one listener of indications has seen since the start. */
+struct DeliveryState {
+    std::string destination; ///< the name of the destination
+    std::string url;
+    std::uint64_t queued = 0;
+    std::uint64_t queuedBytes = 0;
+    std::uint64_t sent = 0;
+    std::uint64_t retried = 0;
+    std::uint64_t dropped = 0;
+    std::string lastError;
+    std::uint64_t failingSince = 0; ///< seconds since 1970; 0: the last try was good
+    Latency latency;                ///< from the provider to the listener's answer; no highest
+};
+
 struct StatusReport {
     std::string version;
     std::uint64_t process = 0;
@@ -32,6 +46,7 @@ struct StatusReport {
     Latency latency;
     std::uint64_t openEnumerations = 0;
     std::vector<ProviderState> providers;
+    std::vector<DeliveryState> deliveries;
     std::uint64_t residentBytes = 0;
     std::uint64_t lostLogLines = 0;
 };

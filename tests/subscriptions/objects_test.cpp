@@ -101,6 +101,19 @@ TEST_F(ObjectsTest, CompareEqualToEnumeratedPathsHoweverTheyWereReferredTo) {
     }
 }
 
+TEST_F(ObjectsTest, AreFoundByReferencesWhoseClassNameHasTheNameSpace) {
+    const ObjectPath made = subscribe(makeFilter(), makeDestination());
+    ObjectPath written{"", "root/interop", "CIM_IndicationSubscription", {}};
+    for (const NamedValue& key : made.keys) {
+        ObjectPath end = *std::get<std::shared_ptr<const ObjectPath>>(key.value.data);
+        end.className = "127.0.0.1/" + end.nameSpace + ":" + end.className;
+        end.nameSpace.clear();
+        written.keys.push_back(reference(key.name, end));
+    }
+    EXPECT_EQ(get(written).path, made);
+    EXPECT_TRUE(manager->deleteInstance(written).ok());
+}
+
 TEST_F(ObjectsTest, AreThereOnce) {
     const ObjectPath filter = makeFilter();
     EXPECT_EQ(tryToMake("CIM_IndicationFilter", {text("Name", "filter"), text("Query", "SELECT * FROM Test_Alert"),
