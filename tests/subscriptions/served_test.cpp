@@ -34,8 +34,8 @@ class ServedSubscriptions : public SubscribedServer {
     }
 
     /** The path of an object as a reference: wbemcli takes it without quotes of its own. */
-    static std::string reference(const std::string& className, const std::string& name) {
-        return "127.0.0.1/root/interop:" + className + "." + keys(className, name);
+    static std::string reference(const std::string& host, const std::string& className, const std::string& name) {
+        return host + "/root/interop:" + className + "." + keys(className, name);
     }
 };
 
@@ -47,8 +47,11 @@ TEST_F(ServedSubscriptions, AreMadeAndRemovedByWbemcli) {
                  "SourceNamespace=\"root/tavis\""});
     printed({"ci", interop(destination + "." + keys(destination, "d")),
              keys(destination, "d") + ",Destination=\"" + listener.url() + "\""});
-    const std::string ends = "Filter=" + reference(filter, "f") + ",Handler=" + reference(destination, "d");
-    printed({"ci", interop("CIM_IndicationSubscription." + ends), ends});
+    const auto endsAt = [&](const std::string& host) {
+        return "Filter=" + reference(host, filter, "f") + ",Handler=" + reference(host, destination, "d");
+    };
+    const std::string ends = endsAt("localhost"); // a path with a point in its host is too much for wbemcli
+    printed({"ci", interop("CIM_IndicationSubscription." + ends), endsAt("127.0.0.1")});
     EXPECT_THAT(printed({"ein", interop("CIM_IndicationSubscription")}), HasSubstr("CIM_IndicationSubscription."));
     EXPECT_THAT(printed({"ain", "-ac", "CIM_IndicationSubscription", interop(filter + "." + keys(filter, "f"))}),
                 HasSubstr(destination));
