@@ -79,7 +79,8 @@ std::string Listener::Received::property(const std::string& name) const {
     return begin == std::string::npos ? "" : body.substr(begin + 7, body.find("</VALUE>", begin) - begin - 7);
 }
 
-Listener::Listener(React react, const Identity& identity) : _tls(makeTls(identity)), _react(std::move(react)) {
+Listener::Listener(React react, const Identity& identity, bool isEverywhere)
+    : _tls(makeTls(identity)), _isEverywhere(isEverywhere), _react(std::move(react)) {
     start();
 }
 
@@ -99,7 +100,7 @@ void Listener::start() {
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_port = htons(_port);
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    address.sin_addr.s_addr = htonl(_isEverywhere ? INADDR_ANY : INADDR_LOOPBACK);
     socklen_t size = sizeof(address);
     auto* generic = reinterpret_cast<sockaddr*>(&address);
     if (::bind(_listening.get(), generic, size) != 0 || ::listen(_listening.get(), 128) != 0 ||

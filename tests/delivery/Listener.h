@@ -20,7 +20,8 @@ using SSL_CTX = struct ssl_ctx_st;
 
 namespace marlo::delivery {
 
-/** Listens on a port of the loopback interface, a thread for each connection. Any thread. */
+/** Listens on a port of the loopback interface, or of all where it is everywhere, a thread for each connection. Any
+ * thread. */
 class Listener {
   public:
     /** An export request as it came. */
@@ -51,7 +52,7 @@ class Listener {
         std::string keyFile;
     };
 
-    explicit Listener(React react = accept, const Identity& identity = {});
+    explicit Listener(React react = accept, const Identity& identity = {}, bool isEverywhere = false);
     ~Listener();
     Listener(const Listener&) = delete;
     Listener& operator=(const Listener&) = delete;
@@ -84,6 +85,7 @@ class Listener {
     bool send(Stream& stream, const Reaction& reaction);
 
     std::shared_ptr<SSL_CTX> _tls;
+    const bool _isEverywhere;
     unsigned short _port = 0;
     http::Descriptor _listening;
     std::thread _acceptor;
