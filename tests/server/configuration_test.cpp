@@ -76,6 +76,7 @@ TEST_F(ServerConfiguration, IsTheUsualOneWhereTheFileSaysNothing) {
 TEST_F(ServerConfiguration, TakesEveryKey) {
     std::filesystem::create_directories(path("mof"));
     std::filesystem::create_directories(path("reg"));
+    std::ofstream(path("ca.pem")) << "";
     const Configuration configuration = read(R"(
 [listen]
 http = ["127.0.0.1:1", "[::1]:2"]
@@ -99,6 +100,11 @@ state = "s"
 level = "warning"
 format = "json"
 sink = "file:log"
+[indications]
+authorities = "ca.pem"
+unverified = ["station.example"]
+queue_length = 7
+queue_bytes = 65536
 [limits]
 connections = 10
 connections_per_peer = 5
@@ -127,6 +133,7 @@ send_seconds = 4
     EXPECT_EQ(configuration.log.level, LogLevel::warning);
     EXPECT_EQ(configuration.log.format, LogFormat::json);
     EXPECT_EQ(configuration.log.sink, "file:" + path("log"));
+    EXPECT_EQ(configuration.indications, (IndicationOptions{path("ca.pem"), {"station.example"}, 7, 65536}));
     EXPECT_EQ(configuration.limits.connections, 10U);
     EXPECT_EQ(configuration.limits.connectionsPerPeer, 5U);
     EXPECT_EQ(configuration.limits.workers, 2U);
