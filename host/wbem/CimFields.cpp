@@ -163,7 +163,7 @@ CimFields readCimFields(const http::RequestHead& head, std::optional<std::string
     }
     const auto version = single(head, prefix, "CIMProtocolVersion");
     if (version && !version->starts_with("1.")) {
-        throw HttpError(notImplemented, "unsupported-protocol-version", "CIMProtocolVersion is 1.x, not " + *version);
+        throw HttpError(badRequest, "unsupported-protocol-version", "CIMProtocolVersion is 1.x, not " + *version);
     }
     CimFields fields;
     fields.method = requireDecoded(head, prefix, "CIMMethod");

@@ -55,11 +55,11 @@ HttpError httpError(const cimxml::MessageError& error) {
     case Kind::unsupportedOperation:
         return {badRequest, "unsupported-operation", error.what()};
     case Kind::unsupportedCimVersion:
-        return {notImplemented, "unsupported-cim-version", error.what()};
+        return {badRequest, "unsupported-cim-version", error.what()};
     case Kind::unsupportedDtdVersion:
-        return {notImplemented, "unsupported-dtd-version", error.what()};
+        return {badRequest, "unsupported-dtd-version", error.what()};
     case Kind::unsupportedProtocolVersion:
-        return {notImplemented, "unsupported-protocol-version", error.what()};
+        return {badRequest, "unsupported-protocol-version", error.what()};
     case Kind::multipleRequestsUnsupported:
         return {notImplemented, "multiple-requests-unsupported", error.what()};
     }
