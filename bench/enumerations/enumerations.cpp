@@ -13,8 +13,11 @@ namespace {
 void enumerate(benchmark::State& state, const char* className) {
     const auto adapters = static_cast<long>(state.range(0));
     const DescribedHost host(static_cast<int>(adapters));
-    ObjectManager manager(
-        {MARLO_SHARE_DIRECTORY "/schema", MARLO_SHARE_DIRECTORY "/providers", MARLO_LIBRARY_DIRECTORY, {}, false});
+    ObjectManager manager({{MARLO_SHARE_DIRECTORY "/schema"},
+                           {MARLO_SHARE_DIRECTORY "/providers"},
+                           MARLO_LIBRARY_DIRECTORY,
+                           {},
+                           false});
     const auto request = [&] {
         long count = 0;
         const Status status =

@@ -36,7 +36,7 @@ Subscriber::Subscriber()
     inForce = this;
     registerTimedProvider(_registrations);
     _manager = std::make_unique<ObjectManager>(ObjectManagerOptions{
-        MARLO_SHARE_DIRECTORY "/schema", _registrations.string(), MARLO_LIBRARY_DIRECTORY, {}, false});
+        {MARLO_SHARE_DIRECTORY "/schema"}, {_registrations.string()}, MARLO_LIBRARY_DIRECTORY, {}, false});
     for (const char* event : EVENTS) {
         SubscriptionId id = 0;
         const Status status = _manager->subscribe(

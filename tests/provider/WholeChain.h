@@ -26,8 +26,8 @@ class WholeChain {
   public:
     WholeChain()
         : _manager(
-              std::make_unique<marlo::ObjectManager>(marlo::ObjectManagerOptions{MARLO_SHARE_DIRECTORY "/schema",
-                                                                                 MARLO_SHARE_DIRECTORY "/providers",
+              std::make_unique<marlo::ObjectManager>(marlo::ObjectManagerOptions{{MARLO_SHARE_DIRECTORY "/schema"},
+                                                                                 {MARLO_SHARE_DIRECTORY "/providers"},
                                                                                  MARLO_LIBRARY_DIRECTORY,
                                                                                  {},
                                                                                  false})) {
