@@ -90,14 +90,14 @@ void Arena::keep(std::shared_ptr<const void> thing) {
     _kept.push_back(std::move(thing));
 }
 
-StringObject** Arena::nameCache() {
+Arena::RecurringTexts* Arena::recurringTexts() {
     if (!isOwner()) {
         return nullptr;
     }
-    if (_names == nullptr) {
-        _names = makeArray<StringObject*>(nameCacheSize);
+    if (_recurring == nullptr) {
+        _recurring = make<RecurringTexts>();
     }
-    return _names;
+    return _recurring;
 }
 
 void* Arena::allocatePiece(std::size_t bytes, bool zeroed) {

@@ -55,13 +55,19 @@ class Arena {
         return array;
     }
 
-    /** Strings by which names that recur in this arena are found again; null when the caller may not use it. */
-    StringObject** nameCache();
+    /** Strings by which texts that recur in this arena are found again. */
+    struct RecurringTexts {
+        static constexpr std::size_t size = 64; ///< a power of two
+
+        StringObject* names[size] = {};
+        StringObject* values[size] = {}; ///< apart, since values that do not recur push others out
+    };
+
+    /** Null when the caller may not use them. */
+    RecurringTexts* recurringTexts();
 
     /** Keeps a thing alive as long as the arena. */
     void keep(std::shared_ptr<const void> thing);
-
-    static constexpr std::size_t nameCacheSize = 64; ///< a power of two
 
     /** The object whose release ends this arena; null for the arena of a call, whose objects end with the call. */
     [[nodiscard]] const void* root() const { return _root; }
@@ -98,7 +104,7 @@ class Arena {
     std::mutex _mutex; ///< guards _shared, _pieces and _kept
     std::unordered_set<void*> _pieces;
     std::vector<std::shared_ptr<const void>> _kept;
-    StringObject** _names = nullptr;
+    RecurringTexts* _recurring = nullptr;
     const void* _root = nullptr;
 };
 

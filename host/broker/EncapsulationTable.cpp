@@ -46,7 +46,7 @@ CMPIString* newString(CMPIStatus& status, BrokerState& /*broker*/, const char* t
         status.rc = CMPI_RC_ERR_INVALID_PARAMETER;
         return nullptr;
     }
-    return &StringObject::make(currentArena(), text)->handle;
+    return &StringObject::makeValue(currentArena(), text)->handle;
 }
 
 CMPIArray* newArray(CMPIStatus& status, BrokerState& /*broker*/, CMPICount count, CMPIType type) {

@@ -22,7 +22,7 @@ void NamedList::set(std::string_view name, const CMPIData& data) {
     if (_size == _capacity) {
         grow(_capacity == 0 ? _firstCapacity : _capacity * 2);
     }
-    _entries[_size] = {StringObject::makeRecurring(*_arena, name), data};
+    _entries[_size] = {StringObject::makeName(*_arena, name), data};
     ++_size;
 }
 

@@ -17,7 +17,7 @@ CMPIrc setText(ObjectPathObject& path, StringObject*& member, const char* text) 
     }
     // What a caller read before stays as it was: the string is replaced, not changed.
     if (textOf(member) != text) {
-        member = StringObject::makeRecurring(path.arena(), text);
+        member = StringObject::makeName(path.arena(), text);
     }
     return CMPI_RC_OK;
 }
@@ -137,8 +137,8 @@ CMPIString* toString(CMPIStatus&, ObjectPathObject& path) {
 ObjectPathObject* ObjectPathObject::make(Arena& arena, const BrokerState& broker, std::string_view nameSpace,
                                          std::string_view className) {
     auto* path = arena.make<ObjectPathObject>(arena, broker);
-    path->nameSpace = StringObject::makeRecurring(arena, nameSpace);
-    path->className = StringObject::makeRecurring(arena, className);
+    path->nameSpace = StringObject::makeName(arena, nameSpace);
+    path->className = StringObject::makeName(arena, className);
     return path;
 }
 

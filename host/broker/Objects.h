@@ -44,7 +44,7 @@ enum class Kind : std::uint32_t {
 /** What all objects begin with. */
 class ObjectBase {
   public:
-    ObjectBase(Kind kind, Arena* arena) : _arena(arena), _kind(kind) {}
+    ObjectBase(Kind kind, Arena* arena, std::uint32_t number = 0) : _arena(arena), _kind(kind), _number(number) {}
 
     [[nodiscard]] Kind kind() const { return _kind; }
 
@@ -57,9 +57,14 @@ class ObjectBase {
     /** The object behind any encapsulated handle, or null where there is none. */
     static ObjectBase* of(const void* handle);
 
+  protected:
+    /** For the object's own use: it lies where there would be nothing, and there are many strings. */
+    [[nodiscard]] std::uint32_t number() const { return _number; }
+
   private:
     Arena* _arena;
     Kind _kind;
+    std::uint32_t _number;
 };
 
 /** The layout that all encapsulated types share. */
@@ -87,7 +92,8 @@ class Object : public ObjectBase {
 
   protected:
     template <typename Table>
-    Object(Arena* arena, const Table& table) : ObjectBase(KindValue, arena), handle{this, &table} {}
+    Object(Arena* arena, const Table& table, std::uint32_t number = 0)
+        : ObjectBase(KindValue, arena, number), handle{this, &table} {}
 
     ~Object() = default;
 };
@@ -115,10 +121,13 @@ class StringObject final : public Object<CMPIString, Kind::string> {
   public:
     static StringObject* make(Arena& arena, std::string_view text);
 
-    /** For texts that recur in every object of a call: mostly one string for all of them. */
-    static StringObject* makeRecurring(Arena& arena, std::string_view text);
+    /** For names, which recur in every object of a call: mostly one string for all of them. */
+    static StringObject* makeName(Arena& arena, std::string_view name);
 
-    [[nodiscard]] std::string_view text() const { return {characters(), _length}; }
+    /** For values, many of which are the same in every instance that a call makes. */
+    static StringObject* makeValue(Arena& arena, std::string_view value);
+
+    [[nodiscard]] std::string_view text() const { return {characters(), number()}; }
 
     /** Zero-terminated; they follow the object. */
     [[nodiscard]] const char* characters() const { return reinterpret_cast<const char*>(this + 1); }
@@ -129,9 +138,9 @@ class StringObject final : public Object<CMPIString, Kind::string> {
   private:
     friend class Arena;
 
-    StringObject(Arena& arena, std::uint32_t length) : Object(&arena, stringTable), _length(length) {}
+    StringObject(Arena& arena, std::uint32_t length) : Object(&arena, stringTable, length) {}
 
-    std::uint32_t _length;
+    static StringObject* findOrMake(Arena& arena, StringObject** known, std::string_view text);
 };
 
 class ArrayObject final : public Object<CMPIArray, Kind::array> {

@@ -8,6 +8,9 @@ namespace marlo::broker {
 
 namespace {
 
+/** Longer values are hardly the same twice. */
+constexpr std::size_t longestRecurring = 64;
+
 /** FNV-1a. */
 std::size_t hashOf(std::string_view text) {
     std::uint32_t hash = 2166136261U;
@@ -35,16 +38,22 @@ StringObject* StringObject::make(Arena& arena, std::string_view text) {
     return string;
 }
 
-StringObject* StringObject::makeRecurring(Arena& arena, std::string_view text) {
-    StringObject** cache = arena.nameCache();
-    if (cache == nullptr) {
-        return make(arena, text);
-    }
-    StringObject*& slot = cache[hashOf(text) % Arena::nameCacheSize];
+StringObject* StringObject::findOrMake(Arena& arena, StringObject** known, std::string_view text) {
+    StringObject*& slot = known[hashOf(text) % Arena::RecurringTexts::size];
     if (slot == nullptr || slot->text() != text) {
         slot = make(arena, text);
     }
     return slot;
+}
+
+StringObject* StringObject::makeName(Arena& arena, std::string_view name) {
+    auto* known = arena.recurringTexts();
+    return known == nullptr ? make(arena, name) : findOrMake(arena, known->names, name);
+}
+
+StringObject* StringObject::makeValue(Arena& arena, std::string_view value) {
+    auto* known = value.size() > longestRecurring ? nullptr : arena.recurringTexts();
+    return known == nullptr ? make(arena, value) : findOrMake(arena, known->values, value);
 }
 
 StringObject* StringObject::copyTo(Arena& target) {

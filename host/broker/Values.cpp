@@ -119,7 +119,7 @@ CMPIrc takeValue(Arena& arena, const CMPIValue* value, CMPIType type, Accepted a
     if (type == CMPI_chars) {
         // The pointer is the text itself.
         const auto* text = static_cast<const char*>(static_cast<const void*>(value));
-        taken.value.string = &StringObject::make(arena, text)->handle;
+        taken.value.string = &StringObject::makeValue(arena, text)->handle;
     } else if (pointer) {
         taken.value.dataPtr = value->dataPtr;
     } else if (const std::size_t size = simpleSize(type); size != 0) {

@@ -19,6 +19,7 @@
 #include <stdexcept>
 #include <utility>
 
+#include <malloc.h>
 #include <poll.h>
 #include <unistd.h>
 
@@ -134,6 +135,8 @@ Daemon::State::State(DaemonOptions&& given)
       log(configuration.log),
       requestLog(log, statistics),
       listeners(chooseListeners(configuration.listen, usualPlaces().socket, options.trial)) {
+    // One heap for all threads: a large answer leaves its memory to the next one, whichever thread makes that.
+    ::mallopt(M_ARENA_MAX, 1);
     ::signal(SIGPIPE, SIG_IGN); // a client or a reader of the log that goes away is an error where it is written to
     if (usesTls(listeners.endpoints)) {
         tls = findCertificate(configuration);
