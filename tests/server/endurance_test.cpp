@@ -33,7 +33,7 @@ TEST_F(Endurance, StartsOverTheSocketOfOneThatWasKilled) {
 TEST_F(Endurance, LeavesBusyPlacesToTheServerThatHasThem) {
     start();
     const std::string taken = "127.0.0.1:" + std::to_string(port("http"));
-    write("second.toml", "[listen]\nhttps = []\n[directories]\nstate = \"state\"\n");
+    write("second.toml", "[listen]\nhttps = []\n[directories]\nstate = \"second\"\n");
     const std::vector<std::string> places{"serve", "--config", path("second.toml"), "--http", taken, "--socket"};
     auto arguments = places;
     arguments.insert(arguments.end(), {"none"});
