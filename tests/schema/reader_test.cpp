@@ -80,7 +80,8 @@ TEST_F(SchemaReader, RefusesANamespacesClassThatAllHaveAlready) {
 
 TEST_F(SchemaReader, TakesTheFirstOfAQualifiersDeclarationsInSeveralFiles) {
     write("a.mof", "Qualifier Mine : boolean = false, Scope(class), Flavor(DisableOverride);\n");
-    write("b.mof", "Qualifier MINE : boolean = true, Scope(any);\n#pragma namespace (\"root/one\")\n[Mine] class A {};");
+    write("b.mof",
+          "Qualifier MINE : boolean = true, Scope(any);\n#pragma namespace (\"root/one\")\n[Mine] class A {};");
     const Schema schema = read();
     const auto types = schema.qualifierTypes("root/one");
     const auto mine =
