@@ -42,9 +42,19 @@ class ServedTest : public MarloTest {
         _arguments.insert(_arguments.begin(), program.begin(), program.end());
     }
 
+    /**
+     * Only mount points can be made private, and the root directory of a chroot need not be one: it is bound onto
+     * itself then, and "/.." leads onto what covers it.
+     */
+    static constexpr const char* makeMountsPrivate =
+        "if mount --make-rprivate / 2>/dev/null; then exec \"$@\"; fi\n"
+        "here=$PWD; mount --rbind / /; cd /..\n"
+        "exec chroot . sh -ec 'cd \"$0\"; mount --make-rprivate /; exec \"$@\"' \"$here\" \"$@\"";
+
     /** A shell's commands in a mount namespace of the server's own, before it starts there. */
     void startBehind(const std::string& commands) {
-        startBy({"unshare", "--mount", "sh", "-ec", commands + "\nexec \"$@\"", "sh"});
+        startBy({"unshare", "--mount", "--propagation", "unchanged", "sh", "-ec", makeMountsPrivate, "sh", "sh", "-ec",
+                 commands + "\nexec \"$@\"", "sh"});
     }
 
     /** Starts a server that cannot be; its exit status, once it has ended. */
