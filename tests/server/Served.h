@@ -53,8 +53,8 @@ class ServedTest : public MarloTest {
 
     /** A shell's commands in a mount namespace of the server's own, before it starts there. */
     void startBehind(const std::string& commands) {
-        startBy({"unshare", "--mount", "--propagation", "unchanged", "sh", "-ec", makeMountsPrivate, "sh", "sh", "-ec",
-                 commands + "\nexec \"$@\"", "sh"});
+        startBy({"unshare", "--mount", "--propagation", "unchanged", "sh", "-ec", makeMountsPrivate, "sh", "sh",
+                 "-ec", commands + "\nexec \"$@\"", "sh"});
     }
 
     /** Starts a server that cannot be; its exit status, once it has ended. */
