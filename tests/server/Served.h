@@ -48,7 +48,7 @@ class ServedTest : public MarloTest {
      */
     static constexpr const char* makeMountsPrivate =
         "if mount --make-rprivate / 2>/dev/null; then exec \"$@\"; fi\n"
-        "here=$PWD; mount --rbind / /; cd /..\n"
+        "here=$PWD; mount --rbind / /; cd -P /..\n"
         "exec chroot . sh -ec 'cd \"$0\"; mount --make-rprivate /; exec \"$@\"' \"$here\" \"$@\"";
 
     /** A shell's commands in a mount namespace of the server's own, before it starts there. */
