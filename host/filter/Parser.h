@@ -23,6 +23,8 @@ class Parser {
     bool takeWord(std::string_view word);
     bool takeSymbol(std::string_view symbol);
     void requireWord(std::string_view word);
+    /** Whether a name is next that is no word of the language. */
+    [[nodiscard]] bool atName() const;
     std::string requireName(const std::string& what);
     [[noreturn]] void failExpected(const std::string& what) const;
     [[noreturn]] void failUnsupported(const std::string& what) const;
