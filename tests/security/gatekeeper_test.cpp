@@ -1,151 +1,22 @@
-#include "host/security/Gatekeeper.h"
-#include "tests/support/Namespace.h"
+#include "tests/security/GatekeeperFixture.h"
 
-#include <atomic>
 #include <chrono>
-#include <functional>
-#include <memory>
-#include <mutex>
 #include <optional>
-#include <stdexcept>
-#include <string>
-#include <string_view>
 #include <thread>
-#include <vector>
 
 #include <gmock/gmock.h>
-#include <gtest/gtest.h>
-#include <openssl/evp.h>
-#include <unistd.h>
 
 namespace {
 
 using namespace std::chrono_literals;
+using namespace marlo::test;
 using marlo::http::Answer;
 using marlo::http::Peer;
-using marlo::http::RequestHead;
-using marlo::http::Transport;
 using marlo::security::Admission;
-using marlo::security::Gatekeeper;
-using marlo::security::GatekeeperOptions;
-using marlo::security::PasswordCheck;
 using marlo::security::Role;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-
-/** Accounts that all have the password "good". */
-class Accounts final : public PasswordCheck {
-  public:
-    bool isGood(const std::string& user, const std::string& password) override {
-        ++asked;
-        if (onAsked) {
-            onAsked();
-        }
-        if (password == "throw") {
-            throw std::runtime_error("the accounts are away");
-        }
-        return !user.empty() && password == isTheGoodOne;
-    }
-
-    std::atomic<int> asked = 0;
-    std::string isTheGoodOne = "good";
-    std::function<void()> onAsked;
-};
-
-std::string basic(const std::string& text) {
-    std::vector<unsigned char> encoded(text.size() * 2 + 8);
-    const int length = EVP_EncodeBlock(encoded.data(), reinterpret_cast<const unsigned char*>(text.data()),
-                                       static_cast<int>(text.size()));
-    return "Basic " + std::string(encoded.begin(), encoded.begin() + length);
-}
-
-RequestHead headWith(const std::vector<std::string>& authorizations) {
-    RequestHead head;
-    head.method = "POST";
-    head.target = "/cimom";
-    head.fields = {{"Host", "localhost"}};
-    for (const std::string& value : authorizations) {
-        head.fields.push_back({"authorization", value});
-    }
-    return head;
-}
-
-Peer tcpPeer(const std::string& address = "192.0.2.1") {
-    Peer peer;
-    peer.address = address;
-    peer.port = 4711;
-    return peer;
-}
-
-Peer localPeer(std::optional<unsigned> user) {
-    Peer peer;
-    peer.transport = Transport::local;
-    peer.address = "local";
-    peer.userId = user;
-    return peer;
-}
-
-Peer tlsPeer(const std::string& commonName) {
-    Peer peer = tcpPeer();
-    peer.transport = Transport::tls;
-    peer.commonName = commonName;
-    return peer;
-}
-
-std::string fieldOf(const Answer& answer, std::string_view name) {
-    for (const auto& field : answer.fields) {
-        if (field.name == name) {
-            return field.value;
-        }
-    }
-    return "none";
-}
-
-class GatekeeperTest : public testing::Test {
-  protected:
-    GatekeeperTest() {
-        _options.accounts = _accounts;
-        _options.access = {{"daemon"}, {"root"}, {}};
-        _options.trialUser = "trial";
-        _options.trialPassword = "p";
-    }
-
-    Gatekeeper& keeper() {
-        if (!_keeper) {
-            _keeper = std::make_unique<Gatekeeper>(_options, [this](const std::string& line) {
-                const std::lock_guard<std::mutex> lock(_logMutex);
-                _log.push_back(line);
-            });
-        }
-        return *_keeper;
-    }
-
-    Admission admit(const std::vector<std::string>& authorizations, const Peer& peer = tcpPeer()) {
-        return keeper().admit(headWith(authorizations), peer);
-    }
-
-    /** Who is let in, or the status of the refusal. */
-    std::string outcome(const std::vector<std::string>& authorizations, const Peer& peer = tcpPeer()) {
-        return outcomeOf(admit(authorizations, peer));
-    }
-
-    static std::string outcomeOf(const Admission& admission) {
-        if (!admission.refusal) {
-            return admission.identity.name();
-        }
-        EXPECT_TRUE(admission.identity.isNobody());
-        return std::to_string(admission.refusal->status);
-    }
-
-    std::shared_ptr<Accounts> _accounts = std::make_shared<Accounts>();
-    GatekeeperOptions _options;
-    std::vector<std::string> _log;
-
-  private:
-    std::mutex _logMutex;
-    std::unique_ptr<Gatekeeper> _keeper;
-};
 
 TEST_F(GatekeeperTest, LetsTheTrialUserDoEverything) {
     const Admission admission = admit({basic("trial:p")});
@@ -334,55 +205,6 @@ TEST_F(GatekeeperTest, LogsWhoWasRefused) {
     EXPECT_THAT(_log, ElementsAre("refused 192.0.2.1:4711: user \"ro\\x22ot\": wrong name or password",
                                   "refused 192.0.2.1:4711: user \"" + std::string(64, 'u') +
                                       "\"...: wrong name or password"));
-}
-
-TEST_F(GatekeeperTest, KnowsLocalPeersByTheirUserId) {
-    const Admission root = admit({}, localPeer(0));
-    EXPECT_EQ(root.identity.name(), "root");
-    EXPECT_TRUE(root.identity.may(Role::change));
-    EXPECT_TRUE(root.identity.may(Role::subscribe));
-    EXPECT_TRUE(admit({}, localPeer(geteuid())).identity.may(Role::change));
-    const Admission daemon = admit({}, localPeer(1));
-    EXPECT_EQ(daemon.identity.name(), "daemon");
-    EXPECT_TRUE(daemon.identity.may(Role::read));
-    EXPECT_FALSE(daemon.identity.may(Role::change));
-    EXPECT_EQ(_accounts->asked, 0);
-}
-
-TEST_F(GatekeeperTest, RefusesLocalPeersWithoutARole) {
-    EXPECT_EQ(outcome({}, localPeer(2)), "401");
-    EXPECT_EQ(outcome({}, localPeer(4294967294U)), "401");
-    EXPECT_EQ(outcome({}, localPeer(std::nullopt)), "401");
-    EXPECT_EQ(outcome({basic("trial:p")}, localPeer(2)), "401") << "nobody is asked for a name here";
-    EXPECT_EQ(_log.size(), 4U);
-}
-
-TEST_F(GatekeeperTest, KnowsCertificatesByTheirCommonName) {
-    const Admission admission = admit({}, tlsPeer("daemon"));
-    EXPECT_EQ(admission.identity.name(), "daemon");
-    EXPECT_FALSE(admission.identity.may(Role::change));
-    EXPECT_EQ(outcome({}, tlsPeer("bin")), "401");
-    EXPECT_EQ(outcome({}, tlsPeer("no-such-user")), "401");
-    EXPECT_EQ(outcome({}, tlsPeer("trial")), "401");
-    EXPECT_EQ(outcome({}, tlsPeer("")), "401");
-}
-
-TEST_F(GatekeeperTest, KnowsNoCertificateWithoutTls) {
-    Peer peer = tlsPeer("root");
-    peer.transport = Transport::tcp;
-    EXPECT_EQ(outcome({}, peer), "401");
-}
-
-TEST_F(GatekeeperTest, GoesByTheFieldWhereThereIsACertificateToo) {
-    EXPECT_EQ(outcome({basic("root:good")}, tlsPeer("daemon")), "root");
-    EXPECT_EQ(outcome({basic("root:bad")}, tlsPeer("daemon")), "401");
-    EXPECT_EQ(outcome({"Bearer x"}, tlsPeer("daemon")), "401");
-}
-
-TEST_F(GatekeeperTest, KnowsNoUserIdBeyondTheLocalSocket) {
-    Peer peer = tcpPeer();
-    peer.userId = 0;
-    EXPECT_EQ(outcome({}, peer), "401");
 }
 
 TEST_F(GatekeeperTest, RefusesToBeMadeForUsersThatDoNotExist) {
