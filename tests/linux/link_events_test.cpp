@@ -1,16 +1,13 @@
-// From the kernel's messages to events, without a kernel and with one.
-#include "agent/events/Differences.h"
-#include "agent/linux/KernelReader.h"
+// From the kernel's messages to events, without a kernel.
 #include "agent/linux/LinkEvents.h"
-#include "agent/linux/LinuxBackEnd.h"
+#include "tests/linux/EventRecorder.h"
 #include "tests/linux/Facts.h"
 #include "tests/linux/NoHardware.h"
 #include "tests/linux/TemporaryHost.h"
-#include "tests/linux/TreeReading.h"
-#include "tests/support/Namespace.h"
 
 #include <map>
-#include <ostream>
+#include <optional>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -21,40 +18,6 @@ namespace {
 using namespace NodeLexicon;
 using namespace Orv::Test;
 using testing::ElementsAre;
-
-struct Seen {
-    std::string name;
-    EventCode code;
-    unsigned status;
-
-    bool operator==(const Seen&) const = default;
-
-    friend std::ostream& operator<<(std::ostream& out, const Seen& seen) {
-        return out << seen.name << ' ' << static_cast<unsigned>(seen.code) << ' ' << seen.status;
-    }
-};
-
-Seen statusOfAdapter(const std::string& name, unsigned status) {
-    return {name, EventCode::status, status};
-}
-
-class Recorder : public EventSink {
-  public:
-    void post(Event event) override {
-        seen.push_back({event.node->description, event.code, Agent::statusOf(*event.node).value_or(0)});
-        events.push_back(std::move(event));
-    }
-
-    void report(const std::string& text) override { ADD_FAILURE() << text; }
-
-    std::vector<Seen> take() {
-        events.clear();
-        return std::exchange(seen, {});
-    }
-
-    std::vector<Seen> seen;
-    std::vector<Event> events;
-};
 
 /** A state that a test changes link by link. */
 struct LinkEventsTest : testing::Test {
@@ -81,7 +44,7 @@ struct LinkEventsTest : testing::Test {
     HostConfiguration configuration{host.root()};
     KernelState state;
     HostTree tree{noHardware()};
-    Recorder recorder;
+    EventRecorder recorder;
     std::optional<LinkEvents> events;
 };
 
@@ -263,151 +226,6 @@ TEST_F(TeamEventsTest, tellNothingOfTheFirstPortAndOfTeamsWithoutAnActiveOne) {
     EXPECT_THAT(after(TeamOptions{9, 3, {{3, 10}, {2, 100}}}), ElementsAre());
     EXPECT_THAT(moves(0), ElementsAre()) << "it has left the mode that has one";
     EXPECT_THAT(moves(3), ElementsAre()) << "where it was last";
-}
-
-/** A back end in a namespace, watched without a thread: nothing is read until a test says so. */
-struct WatchTest : testing::Test {
-    void SetUp() override {
-        REQUIRE_NAMESPACES();
-        space = std::make_unique<Namespace>();
-        space->shell("echo 1 > /proc/sys/net/ipv6/conf/default/disable_ipv6");
-        space->run([&] { backEnd = makeLinuxBackEnd({host.root()}); });
-        space->ipBatch("link add left type veth peer name right\nlink set left up\nlink set right up\n");
-        awaited(1U, [&] { return numberOf(*backEnd->snapshot(), "left", PROP_STATUS); });
-        awaited(1U, [&] { return numberOf(*backEnd->snapshot(), "right", PROP_STATUS); });
-        watch = backEnd->watch(recorder);
-    }
-
-    /** What the kernel says until the adapter's status is this. */
-    void settle(const std::string& name, const std::string& state) {
-        awaited(true, [&] { return space->ip("-o link show " + name).find("state " + state) != std::string::npos; });
-    }
-
-    TemporaryHost host;
-    std::unique_ptr<Namespace> space;
-    std::unique_ptr<BackEnd> backEnd;
-    Recorder recorder;
-    std::unique_ptr<EventWatch> watch;
-};
-
-TEST_F(WatchTest, reportsAFlapThatIsOverBeforeItIsRead) {
-    space->ip("link set right down");
-    settle("left", "LOWERLAYERDOWN");
-    space->ip("link set right up");
-    settle("left", "UP");
-    watch->collect();
-    std::map<std::string, std::vector<unsigned>> statuses;
-    for (const Seen& seen : recorder.take()) {
-        if (seen.code == EventCode::status) {
-            statuses[seen.name].push_back(seen.status);
-        }
-    }
-    EXPECT_THAT(statuses["left"], ElementsAre(12, 1));
-    EXPECT_EQ(statuses["right"].front(), 5U);
-    EXPECT_EQ(statuses["right"].back(), 1U);
-    watch->collect();
-    EXPECT_THAT(recorder.take(), ElementsAre());
-}
-
-TEST_F(WatchTest, reportsWhatAReaderOfTheTreeFindsFirst) {
-    space->ip("link set right down");
-    settle("left", "LOWERLAYERDOWN");
-    EXPECT_EQ(numberOf(*backEnd->snapshot(), "left", PROP_STATUS), 12U);
-    EXPECT_THAT(recorder.take(),
-                testing::UnorderedElementsAre(statusOfAdapter("right", 5), statusOfAdapter("left", 12)));
-    watch->collect();
-    EXPECT_THAT(recorder.take(), ElementsAre());
-}
-
-TEST_F(WatchTest, leavesTheTreeToItsReaders) {
-    space->ip("link set right down");
-    settle("left", "LOWERLAYERDOWN");
-    watch->collect();
-    EXPECT_EQ(numberOf(*backEnd->snapshot(), "left", PROP_STATUS), 12U) << "what the watch has read is in the tree";
-    watch.reset();
-    recorder.take();
-    space->ip("link set left down");
-    EXPECT_EQ(numberOf(*backEnd->snapshot(), "left", PROP_STATUS), 5U);
-    EXPECT_THAT(recorder.take(), ElementsAre()) << "the watch has ended";
-}
-
-/** A reader with the smallest queue there is, and the events that come of it. */
-struct OverrunTest : testing::Test {
-    void SetUp() override {
-        REQUIRE_NAMESPACES();
-        space = std::make_unique<Namespace>();
-        space->shell("echo 1 > /proc/sys/net/ipv6/conf/default/disable_ipv6");
-        std::string lines;
-        for (int pair = 0; pair < pairs; ++pair) {
-            const std::string number = std::to_string(pair);
-            lines += "link add a" + number + " type veth peer name b" + number + "\nlink set a" + number +
-                     " up\nlink set b" + number + " up\n";
-        }
-        space->ipBatch(lines);
-        awaited(true, [&] {
-            const std::string shown = space->ip("-o link show");
-            return shown.find("LOWERLAYERDOWN") == std::string::npos && shown.find("NO-CARRIER") == std::string::npos;
-        });
-        space->run([&] { reader = std::make_unique<KernelReader>(1); });
-        configuration.refresh();
-        reader->update();
-        tree.update(reader->state(), configuration, reader->takeChanges());
-        events.emplace(tree, recorder, reader->state());
-        reader->onStep(
-            [this](const KernelState& state) { events->take(state, configuration, reader->takeChanges()); });
-    }
-
-    /** `command` for each pair. */
-    void forEachPair(const std::string& command) {
-        std::string lines;
-        for (int pair = 0; pair < pairs; ++pair) {
-            lines += "link " + command + " a" + std::to_string(pair) + (command == "set" ? " down\n" : "\n");
-        }
-        space->ipBatch(lines);
-    }
-
-    static constexpr int pairs = 200;
-
-    TemporaryHost host;
-    std::unique_ptr<Namespace> space;
-    std::unique_ptr<KernelReader> reader;
-    HostConfiguration configuration{host.root()};
-    HostTree tree{noHardware()};
-    Recorder recorder;
-    std::optional<LinkEvents> events;
-};
-
-TEST_F(OverrunTest, reportsOnceAndInOrderWhatChangedMeanwhile) {
-    const unsigned reads = reader->fullReads();
-    forEachPair("set");
-    awaited(true, [&] {
-        reader->follow();
-        return recorder.seen.size() >= 2U * pairs;
-    });
-    EXPECT_GT(reader->fullReads(), reads) << "nothing was lost";
-    std::map<std::string, std::vector<unsigned>> statuses;
-    for (const Seen& seen : recorder.take()) {
-        statuses[seen.name].push_back(seen.status);
-    }
-    EXPECT_EQ(statuses.size(), 2U * pairs);
-    for (const auto& [name, list] : statuses) {
-        EXPECT_THAT(list, ElementsAre(name[0] == 'a' ? 5U : 12U)) << name;
-    }
-}
-
-TEST_F(OverrunTest, reportsInterfacesThatVanishedMeanwhile) {
-    const unsigned reads = reader->fullReads();
-    forEachPair("del");
-    reader->follow();
-    EXPECT_GT(reader->fullReads(), reads) << "nothing was lost";
-    std::map<std::string, std::vector<unsigned>> statuses;
-    for (const Seen& seen : recorder.take()) {
-        statuses[seen.name].push_back(seen.status);
-    }
-    EXPECT_EQ(statuses.size(), 2U * pairs);
-    for (const auto& [name, list] : statuses) {
-        EXPECT_EQ(list.back(), 5U) << name;
-    }
 }
 
 } // namespace
