@@ -8,10 +8,15 @@
 
 #include "instrumentation/LumLog.h"
 
+#include <algorithm>
 #include <array>
-#include <cstdio>
+#include <charconv>
+#include <cstddef>
+#include <cstring>
 #include <exception>
+#include <limits>
 #include <string>
+#include <string_view>
 #include <utility>
 
 namespace Orv {
@@ -35,10 +40,43 @@ enum TraceLevel : int {
 inline constexpr std::size_t TRACE_BUFFER_SIZE = 512;
 using TraceBuffer = std::array<char, TRACE_BUFFER_SIZE>;
 
+/** Fills a buffer piece by piece; what does not fit before its last byte, which stays zero, is cut. */
+class TraceLine {
+  public:
+    /** Clears `buffer`, which must outlive this. */
+    explicit TraceLine(TraceBuffer& buffer) : _next(buffer.data()), _end(buffer.data() + buffer.size() - 1) {
+        buffer.fill('\0');
+    }
+
+    TraceLine& operator<<(std::string_view text) {
+        const std::size_t length = std::min(text.size(), static_cast<std::size_t>(_end - _next));
+        std::memcpy(_next, text.data(), length);
+        _next += length;
+        return *this;
+    }
+
+    /** A null text shows as "(null)". */
+    TraceLine& operator<<(const char* text) { return *this << std::string_view(text != nullptr ? text : "(null)"); }
+
+    /** The number shows signed: 4294967295 reads -1. */
+    TraceLine& operator<<(unsigned number) {
+        std::array<char, std::numeric_limits<int>::digits10 + 2> digits;
+        const auto end = std::to_chars(digits.begin(), digits.end(), static_cast<int>(number)).ptr;
+        return *this << std::string_view(digits.begin(), static_cast<std::size_t>(end - digits.begin()));
+    }
+
+  private:
+    char* _next;
+    char* _end;
+};
+
 /*
  * Each formatter owns one static buffer that all its callers share, on all threads and without a lock: a line is
  * handed to the logger at once, and two threads that format at the same time may mix their texts. The last byte is
  * never anything but zero, so that even a mixed text ends inside the buffer.
+ *
+ * A provider call writes dozens of lines for each adapter, and nearly all of them are discarded by their level after
+ * they were formatted: putting the pieces together costs a fraction of what printf takes to interpret a format.
  */
 
 /**
@@ -47,21 +85,19 @@ using TraceBuffer = std::array<char, TRACE_BUFFER_SIZE>;
  */
 inline char* trace(const char* file, const char* function, unsigned line, MessageType type) {
     static TraceBuffer buffer;
-    buffer.fill('\0');
-    const int shown = static_cast<int>(line);
+    TraceLine text(buffer);
     switch (type) {
     case TRACE_ENTERING:
-        (void)std::snprintf(buffer.data(), buffer.size(), "ENTERING: %s() in %s [Line: %d]", function, file, shown);
+        text << "ENTERING: " << function << "() in " << file << " [Line: " << line << "]";
         break;
     case TRACE_EXITING:
-        (void)std::snprintf(buffer.data(), buffer.size(), "EXITING: %s() in %s [Line: %d]", function, file, shown);
+        text << "EXITING: " << function << "() in " << file << " [Line: " << line << "]";
         break;
     case TRACE_METHOD:
-        (void)std::snprintf(buffer.data(), buffer.size(), "METHOD: %s() was invoked in %s [Line: %d]", function, file,
-                            shown);
+        text << "METHOD: " << function << "() was invoked in " << file << " [Line: " << line << "]";
         break;
     case TRACE_MESSAGE:
-        (void)std::snprintf(buffer.data(), buffer.size(), "MESSAGE [File: %s, Line: %d]: %s", file, shown, function);
+        text << "MESSAGE [File: " << file << ", Line: " << line << "]: " << function;
         break;
     }
     return buffer.data();
@@ -70,18 +106,14 @@ inline char* trace(const char* file, const char* function, unsigned line, Messag
 /** Formats the line of a variable with a text. Returns the buffer; the text is good until the next call. */
 inline char* trace(const char* name, const char* file, unsigned line, const char* value) {
     static TraceBuffer buffer;
-    buffer.fill('\0');
-    (void)std::snprintf(buffer.data(), buffer.size(), "VARIABLE: '%s' has Value '%s' at line %d in %s", name, value,
-                        static_cast<int>(line), file);
+    TraceLine(buffer) << "VARIABLE: '" << name << "' has Value '" << value << "' at line " << line << " in " << file;
     return buffer.data();
 }
 
-/** Formats the line of a variable with a number, which is shown signed: 4294967295 reads -1. */
+/** Formats the line of a variable with a number. Returns the buffer; the text is good until the next call. */
 inline char* trace(const char* name, const char* file, unsigned line, unsigned value) {
     static TraceBuffer buffer;
-    buffer.fill('\0');
-    (void)std::snprintf(buffer.data(), buffer.size(), "VARIABLE: '%s' has Value '%d' at line %d in %s", name,
-                        static_cast<int>(value), static_cast<int>(line), file);
+    TraceLine(buffer) << "VARIABLE: '" << name << "' has Value '" << value << "' at line " << line << " in " << file;
     return buffer.data();
 }
 

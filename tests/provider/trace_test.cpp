@@ -99,6 +99,12 @@ TEST_F(Trace, LinesThatJustFitAreWhole) {
     EXPECT_THAT(std::string(trace("n", "Unit", 1, value.c_str())), testing::EndsWith("' at line 1 in Unit"));
 }
 
+TEST_F(Trace, NullTextsShowAsSuch) {
+    EXPECT_STREQ(trace("n", "Unit", 7, static_cast<const char*>(nullptr)),
+                 "VARIABLE: 'n' has Value '(null)' at line 7 in Unit");
+    EXPECT_STREQ(trace("Unit", nullptr, 7, TRACE_MESSAGE), "MESSAGE [File: Unit, Line: 7]: (null)");
+}
+
 TEST_F(Trace, AnEventIsFormattedAndWrittenOnceForTheLogAndAgainForTheTrace) {
     int formatted = 0;
     ProviderLog(LOGGER, "Unit", "f").write(6000, 5, [&] {
