@@ -11,6 +11,7 @@
 #include "tests/linux/TemporaryHost.h"
 
 #include <optional>
+#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -36,12 +37,26 @@ class Statuses : public Agent::EventSink {
     std::vector<std::string> _seen;
 };
 
-/** A recording of what happens to one interface that stands on others. */
+/** An interface that stands on others, and the file of what happened to it. */
+struct RecordedInterface {
+    const char* name;
+    const char* fixture;
+
+    friend std::ostream& operator<<(std::ostream& out, const RecordedInterface& shown) { return out << shown.name; }
+};
+
+/** Of eth0, the primary member, and eth1: an active-backup bond of Linux 6.1. */
+inline constexpr RecordedInterface recordedBond{"bond0", "bond_fail_over.links"};
+
+/** Of eth0, with the higher priority, and eth1: run as activebackup by teamd on Linux 6.1. */
+inline constexpr RecordedInterface recordedTeam{"team0", "team_fail_over.links"};
+
+/** A recording, played step by step. */
 class RecordedTest : public testing::Test {
   protected:
-    RecordedTest(const std::string& fixture, std::string interface)
-        : steps(readRecording(MARLO_SOURCE_DIR "/tests/linux/fixtures/" + fixture)),
-          _interface(std::move(interface)) {
+    explicit RecordedTest(const RecordedInterface& interface)
+        : steps(readRecording(std::string(MARLO_SOURCE_DIR "/tests/linux/fixtures/") + interface.fixture)),
+          _interface(interface.name) {
         configuration.refresh();
         for (const RecordedMessage& message : steps.front().messages) {
             state.load(message.parse());

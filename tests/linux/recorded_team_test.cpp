@@ -16,10 +16,9 @@ using testing::IsEmpty;
 using testing::Pair;
 using testing::UnorderedElementsAre;
 
-/** eth0, with the higher priority, and eth1 in team0, which teamd runs as activebackup, on Linux 6.1. */
 class RecordedTeamTest : public RecordedTest {
   protected:
-    RecordedTeamTest() : RecordedTest("team_fail_over.links", "team0") {}
+    RecordedTeamTest() : RecordedTest(recordedTeam) {}
 
     [[nodiscard]] Carrier carrier() const { return state.carrierOf(state.links().at(4)); }
 };
@@ -47,20 +46,6 @@ TEST_F(RecordedTeamTest, answersWithWhatItHadAnnounced) {
               Message((TeamOptions{4, 2, {{2, std::int32_t{100}}, {3, std::int32_t{10}}}})));
     EXPECT_THAT(play("options team0"), IsEmpty());
     EXPECT_THAT(liveStatuses, Each(1U));
-}
-
-TEST_F(RecordedTeamTest, switchesOverAndBackOnceEach) {
-    playUpTo("cable eth0 off");
-    EXPECT_THAT(play("cable eth0 off"), ElementsAre("eth0 12", "team0 32"));
-    EXPECT_THAT(liveStatuses, Each(1U));
-    EXPECT_THAT(play("cable eth0 on"), ElementsAre("eth0 1", "team0 33"));
-    EXPECT_THAT(liveStatuses, Each(1U));
-}
-
-TEST_F(RecordedTeamTest, losingTheBackupIsNoSwitch) {
-    playUpTo("cable eth1 off");
-    EXPECT_THAT(play("cable eth1 off"), ElementsAre("eth1 12"));
-    EXPECT_EQ(liveStatus(), 1U);
 }
 
 TEST_F(RecordedTeamTest, thatLostBothPortsComesBackOnItsBackup) {

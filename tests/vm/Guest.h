@@ -125,6 +125,8 @@ class StatusWatch {
 /** bond0, active-backup, of eth0, its primary member, and eth1; up, with both cables in. */
 class BondTest : public testing::Test {
   protected:
+    static constexpr const char* device = "bond0";
+
     void SetUp() override {
         ip("link add bond0 type bond mode active-backup miimon 100 primary_reselect always");
         ip("link set eth0 master bond0");
@@ -153,6 +155,8 @@ class BondTest : public testing::Test {
 /** team0, which teamd runs as activebackup, of eth0 and eth1; with both cables in when a test begins. */
 class TeamTest : public testing::Test {
   protected:
+    static constexpr const char* device = "team0";
+
     void TearDown() override {
         plugCable("eth0");
         plugCable("eth1");

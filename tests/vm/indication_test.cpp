@@ -1,5 +1,5 @@
 // Fail-over of a real bond and a real team, from the pulled plug to the indication that marlo prints.
-#include "tests/vm/Guest.h"
+#include "tests/vm/FailOver.h"
 
 #include <cstdio>
 #include <nlohmann/json.hpp>
@@ -75,28 +75,16 @@ class MarloWatch {
     std::vector<std::string> _probes;
 };
 
-TEST_F(BondTest, isIndicated) {
-    MarloWatch watch("--json --count 5 --timeout 120");
-    pullCable("eth0");
-    expectCarrier("eth1");
-    plugCable("eth0");
-    expectCarrier("eth0");
-    EXPECT_EQ(watch.wait(), 0);
-    EXPECT_THAT(watch.indications(),
-                ElementsAre("MARLO_NetworkAdapterOfflineEvent eth0", "MARLO_NetworkAdapterSwitchOverEvent bond0",
-                            "MARLO_NetworkAdapterOnlineEvent eth0", "MARLO_NetworkAdapterSwitchBackEvent bond0"));
-}
+TYPED_TEST_SUITE(FailOverTest, FailOvers, FailOverNames);
 
-TEST_F(PreferringTeamTest, isIndicated) {
+TYPED_TEST(FailOverTest, isIndicated) {
     MarloWatch watch("--json --count 5 --timeout 120");
-    pullCable("eth0");
-    expectCarrier("eth1");
-    plugCable("eth0");
-    expectCarrier("eth0");
+    this->switchOverAndBack();
     EXPECT_EQ(watch.wait(), 0);
-    EXPECT_THAT(watch.indications(),
-                ElementsAre("MARLO_NetworkAdapterOfflineEvent eth0", "MARLO_NetworkAdapterSwitchOverEvent team0",
-                            "MARLO_NetworkAdapterOnlineEvent eth0", "MARLO_NetworkAdapterSwitchBackEvent team0"));
+    EXPECT_THAT(watch.indications(), ElementsAre("MARLO_NetworkAdapterOfflineEvent eth0",
+                                                 "MARLO_NetworkAdapterSwitchOverEvent " + this->device,
+                                                 "MARLO_NetworkAdapterOnlineEvent eth0",
+                                                 "MARLO_NetworkAdapterSwitchBackEvent " + this->device));
 }
 
 } // namespace
