@@ -1,12 +1,10 @@
 /** @file Changes of adapters through the object manager, the real provider and the real agent, on a described host.
  */
 #include "host/cimom/ObjectManager.h"
+#include "tests/support/Adapters.h"
+#include "tests/support/DescribedHost.h"
 
 #include <atomic>
-#include <cstdlib>
-#include <filesystem>
-#include <fstream>
-#include <stdexcept>
 #include <thread>
 
 #include <gmock/gmock.h>
@@ -22,14 +20,7 @@ using Values = std::vector<NamedValue>;
 
 const std::string ClassName = "MARLO_NetworkAdapterConfiguration";
 
-constexpr const char* ThreeAdapters = R"([[adapter]]
-identity = "usb0"
-chassis = "BMC"
-dhcp = 3
-ipv4_address = "198.51.100.2"
-ipv4_subnet_mask = "255.255.255.0"
-
-[[adapter]]
+const std::string ThreeAdapters = std::string(controllerAdapter) + R"([[adapter]]
 identity = "eth0"
 dhcp = 3
 ipv4_address = "192.0.2.10"
@@ -43,31 +34,6 @@ dhcp = 1
 ipv4_address = "203.0.113.10"
 ipv4_subnet_mask = "255.255.255.0"
 )";
-
-/** The agent of a process shows one host, whose description each test writes anew. */
-const std::filesystem::path& treeFile() {
-    static const std::filesystem::path file = [] {
-        std::string pattern = (std::filesystem::temp_directory_path() / "marlo-changes-XXXXXX").string();
-        if (mkdtemp(pattern.data()) == nullptr) {
-            throw std::runtime_error("cannot make a directory like " + pattern);
-        }
-        const std::filesystem::path path = std::filesystem::path(pattern) / "host.toml";
-        setenv("ORV_AGENT_BACKEND", "file", 1);
-        setenv("ORV_AGENT_TREE", path.c_str(), 1);
-        return path;
-    }();
-    return file;
-}
-
-class RemoveTree : public testing::Environment {
-  public:
-    void TearDown() override {
-        std::error_code ignored;
-        std::filesystem::remove_all(treeFile().parent_path(), ignored);
-    }
-};
-
-const auto* const removal = testing::AddGlobalTestEnvironment(new RemoveTree); // NOLINT(cert-err58-cpp)
 
 Value texts(const std::vector<std::string>& elements) {
     Value::Array array;
@@ -84,7 +50,7 @@ ObjectPath pathOf(const std::string& adapter) {
 class AdapterChanges : public testing::Test {
   protected:
     AdapterChanges() {
-        std::ofstream(treeFile()) << ThreeAdapters;
+        describeHost(ThreeAdapters);
         ObjectManagerOptions options;
         options.schemaDirectories = {MARLO_SHARE "/schema"};
         options.providerDirectories = {MARLO_SHARE "/providers"};

@@ -1,5 +1,8 @@
 #include "tests/cli/Marlo.h"
 
+#include "tests/cli/fixtures/FixtureClasses.h"
+#include "tests/support/Adapters.h"
+
 #include <array>
 #include <cstdlib>
 #include <filesystem>
@@ -15,27 +18,13 @@ namespace marlo::test {
 
 namespace {
 
-constexpr const char* FourAdapters = R"([host]
+const std::string FourAdapters = std::string(R"([host]
 description = "lab"
 
 [[adapter]]
 identity = "bond0"
-description = "Uplink"
 device = "Bonding driver"
-status = 1
-dhcp = 3
-ip_support = 3
-ipv4_address = "192.0.2.10"
-ipv4_subnet_mask = "255.255.255.0"
-ipv6_address = "2001:db8:0:2::10"
-default_gateway = "192.0.2.1"
-dns_servers = ["192.0.2.53", "2001:db8:0:2::53"]
-dns_suffixes = ["lab.example.org", "example.org"]
-dns_hostname = "lab"
-dns_domain = "lab.example.org"
-mac_address = "02:00:5e:10:00:01"
-
-[[adapter]]
+)") + uplinkProperties + R"([[adapter]]
 identity = "eth0"
 device = "Card"
 status = 1
@@ -65,18 +54,9 @@ dhcp = 3
 mac_address = "02:00:5e:10:00:04"
 )";
 
-constexpr const char* FixtureMof = R"(
-Qualifier Key : boolean = false, Scope(property, reference), Flavor(DisableOverride);
-#pragma namespace ("root/test")
-class TEST_Base { [Key] string Id; string Text; };
-class TEST_Typed : TEST_Base {
-    string Nothing; string Texts[]; uint8 Unsigned8; uint64 Unsigned64; sint64 Signed64; real64 Real; boolean Truth;
-    char16 Character; datetime When; TEST_Typed REF Other;
-};
-class TEST_Throwing { [Key] string Id; };
-class TEST_Refusing { [Key] string Id; };
-class TEST_Partial { [Key] string Id; };
-class TEST_Empty { [Key] string Id; };
+const std::string FixtureMof =
+    std::string("Qualifier Key : boolean = false, Scope(property, reference), Flavor(DisableOverride);") +
+    fixtureClasses + R"(
 class TEST_Unserved { [Key] string Id; };
 class TEST_Elsewhere { [Key] string Id; };
 )";
@@ -190,18 +170,7 @@ Outcome runProgram(const std::vector<std::string>& arguments, const std::vector<
     return outcome;
 }
 
-MarloTest::MarloTest() {
-    std::string pattern = testing::TempDir() + "marlo-cli-XXXXXX";
-    if (mkdtemp(pattern.data()) == nullptr) {
-        throw std::runtime_error("mkdtemp failed");
-    }
-    _directory = pattern;
-    _tree = write("host.toml", FourAdapters);
-}
-
-MarloTest::~MarloTest() {
-    std::filesystem::remove_all(_directory);
-}
+MarloTest::MarloTest() : _tree(write("host.toml", FourAdapters)) {}
 
 std::string MarloTest::write(const std::string& name, const std::string& text) const {
     const std::string file = path(name);
@@ -212,7 +181,7 @@ std::string MarloTest::write(const std::string& name, const std::string& text) c
 
 Outcome MarloTest::marlo(std::vector<std::string> arguments) const {
     arguments.insert(arguments.begin(), MARLO_EXECUTABLE);
-    return runProgram(arguments, {"ORV_AGENT_TREE=" + _tree}, "", _directory);
+    return runProgram(arguments, {"ORV_AGENT_TREE=" + _tree}, "", directory());
 }
 
 nlohmann::ordered_json MarloTest::marloJson(std::vector<std::string> arguments) const {

@@ -4,6 +4,8 @@
  */
 #pragma once
 
+#include "tests/security/TemporaryDirectory.h"
+
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -27,26 +29,23 @@ Outcome runProgram(const std::vector<std::string>& arguments, const std::vector<
 class MarloTest : public testing::Test {
   protected:
     MarloTest();
-    ~MarloTest() override;
-    MarloTest(const MarloTest&) = delete;
-    MarloTest& operator=(const MarloTest&) = delete;
 
     /** marlo with these arguments, on the described host. */
     [[nodiscard]] Outcome marlo(std::vector<std::string> arguments) const;
     /** The same, with --json; the test fails when the output is no JSON or the exit code is not 0. */
     [[nodiscard]] nlohmann::ordered_json marloJson(std::vector<std::string> arguments) const;
 
-    [[nodiscard]] std::string path(const std::string& name) const { return _directory + "/" + name; }
+    [[nodiscard]] std::string path(const std::string& name) const { return _directory.file(name); }
 
     /** Writes a file below the test's directory; returns its path. */
     std::string write(const std::string& name, const std::string& text) const;
 
     [[nodiscard]] const std::string& tree() const { return _tree; }
 
-    [[nodiscard]] const std::string& directory() const { return _directory; }
+    [[nodiscard]] std::string directory() const { return _directory.path().string(); }
 
   private:
-    std::string _directory;
+    TemporaryDirectory _directory;
     std::string _tree;
 };
 

@@ -14,7 +14,7 @@ namespace marlo::test {
 class TemporaryDirectory {
   public:
     TemporaryDirectory() {
-        std::string name = (std::filesystem::temp_directory_path() / "marlo-security-XXXXXX").string();
+        std::string name = (std::filesystem::temp_directory_path() / "marlo-test-XXXXXX").string();
         if (mkdtemp(name.data()) == nullptr) {
             throw std::runtime_error(name);
         }

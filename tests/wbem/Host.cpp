@@ -1,8 +1,11 @@
 #include "tests/wbem/Host.h"
 
-#include <cstdlib>
+#include "tests/cli/fixtures/FixtureClasses.h"
+#include "tests/support/Adapters.h"
+#include "tests/support/DescribedHost.h"
+
+#include <filesystem>
 #include <fstream>
-#include <stdexcept>
 
 #include <gtest/gtest.h>
 
@@ -10,34 +13,13 @@ namespace marlo::test {
 
 namespace {
 
-constexpr const char* tree = R"([host]
+const std::string description = std::string(R"([host]
 description = "lab"
 
-[[adapter]]
-identity = "usb0"
-chassis = "BMC"
-dhcp = 3
-ipv4_address = "198.51.100.2"
-ipv4_subnet_mask = "255.255.255.0"
-
-[[adapter]]
+)") + controllerAdapter + R"([[adapter]]
 identity = "eth0"
-description = "Uplink"
 device = "Card"
-status = 1
-dhcp = 3
-ip_support = 3
-ipv4_address = "192.0.2.10"
-ipv4_subnet_mask = "255.255.255.0"
-ipv6_address = "2001:db8:0:2::10"
-default_gateway = "192.0.2.1"
-dns_servers = ["192.0.2.53", "2001:db8:0:2::53"]
-dns_suffixes = ["lab.example.org", "example.org"]
-dns_hostname = "lab"
-dns_domain = "lab.example.org"
-mac_address = "02:00:5e:10:00:01"
-
-[[adapter]]
+)" + uplinkProperties + R"([[adapter]]
 identity = "eth1"
 device = "Card"
 status = 12
@@ -47,27 +29,6 @@ ipv4_subnet_mask = "255.255.255.0"
 mac_address = "02:00:5e:10:00:02"
 )";
 
-constexpr const char* fixtureMof = R"(
-#pragma namespace ("root/test")
-class TEST_Base { [Key] string Id; string Text; };
-class TEST_Typed : TEST_Base {
-    string Nothing; string Texts[]; uint8 Unsigned8; uint64 Unsigned64; sint64 Signed64; real64 Real; boolean Truth;
-    char16 Character; datetime When; TEST_Typed REF Other;
-};
-class TEST_Throwing { [Key] string Id; };
-class TEST_Refusing { [Key] string Id; };
-class TEST_Partial { [Key] string Id; };
-class TEST_Empty { [Key] string Id; uint32 Grow(); };
-)";
-
-std::filesystem::path makeDirectory() {
-    std::string pattern = (std::filesystem::temp_directory_path() / "marlo-wbem-XXXXXX").string();
-    if (mkdtemp(pattern.data()) == nullptr) {
-        throw std::runtime_error("cannot make a directory like " + pattern);
-    }
-    return pattern;
-}
-
 void write(const std::filesystem::path& file, const std::string& text) {
     std::filesystem::create_directories(file.parent_path());
     std::ofstream(file) << text;
@@ -76,23 +37,6 @@ void write(const std::filesystem::path& file, const std::string& text) {
 std::string backwards(const std::string& text) {
     return {text.rbegin(), text.rend()};
 }
-
-/** The agent of a process reads one description, from the same place for all hosts that there are in turn. */
-const std::filesystem::path& treeFile() {
-    static const std::filesystem::path directory = makeDirectory();
-    static const std::filesystem::path file = directory / "host.toml";
-    return file;
-}
-
-class RemoveTree : public testing::Environment {
-  public:
-    void TearDown() override {
-        std::error_code ignored;
-        std::filesystem::remove_all(treeFile().parent_path(), ignored);
-    }
-};
-
-const auto* const removal = testing::AddGlobalTestEnvironment(new RemoveTree); // NOLINT(cert-err58-cpp)
 
 class BackwardsCheck final : public security::PasswordCheck {
   public:
@@ -130,19 +74,17 @@ std::string base64(const std::string& text) {
 
 } // namespace
 
-Host::Host(const wbem::Limits& limits, std::vector<wbem::Route> routes) : _directory(makeDirectory()) {
-    write(treeFile(), tree);
-    setenv("ORV_AGENT_BACKEND", "file", 1);
-    setenv("ORV_AGENT_TREE", treeFile().c_str(), 1);
-    write(_directory / "schema/test.mof", std::string(fixtureMof) + itemsMof);
-    write(_directory / "providers/fixture.toml",
+Host::Host(const wbem::Limits& limits, std::vector<wbem::Route> routes) {
+    describeHost(description);
+    write(_directory.path() / "schema/test.mof", std::string(fixtureClasses) + itemsMof);
+    write(_directory.path() / "providers/fixture.toml",
           "library = \"" MARLO_FIXTURE_PROVIDER
           "\"\n[[provider]]\nname = \"FixtureProvider\"\nkinds = [\"instance\"]\n"
           "namespaces = [\"root/test\"]\nclasses = [\"TEST_Typed\", \"TEST_Throwing\", \"TEST_Refusing\", "
           "\"TEST_Partial\", \"TEST_Empty\"]\n");
     ObjectManagerOptions options;
-    options.schemaDirectories = {MARLO_SHARE "/schema", (_directory / "schema").string()};
-    options.providerDirectories = {MARLO_SHARE "/providers", (_directory / "providers").string()};
+    options.schemaDirectories = {MARLO_SHARE "/schema", _directory.file("schema")};
+    options.providerDirectories = {MARLO_SHARE "/providers", _directory.file("providers")};
     options.libraryDirectory = MARLO_LIBRARIES;
     options.log = [](const std::string& /*line*/) {};
     _manager = std::make_unique<ObjectManager>(options);
@@ -165,8 +107,6 @@ Host::Host(const wbem::Limits& limits, std::vector<wbem::Route> routes) : _direc
 Host::~Host() {
     _service.reset();
     _manager.reset();
-    std::error_code ignored;
-    std::filesystem::remove_all(_directory, ignored);
 }
 
 std::vector<wbem::Record> Host::records() const {

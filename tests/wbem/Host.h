@@ -8,9 +8,9 @@
 #include "host/http/Server.h"
 #include "host/security/Gatekeeper.h"
 #include "host/wbem/Service.h"
+#include "tests/security/TemporaryDirectory.h"
 #include "tests/wbem/Items.h"
 
-#include <filesystem>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -44,7 +44,7 @@ class Host {
     static std::string credentials(const std::string& user);
 
   private:
-    std::filesystem::path _directory;
+    TemporaryDirectory _directory;
     mutable std::mutex _mutex;
     std::vector<wbem::Record> _records;
     std::shared_ptr<Items> _items = std::make_shared<Items>();
