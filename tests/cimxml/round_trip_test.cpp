@@ -1,7 +1,7 @@
 /** @file What is written is valid, and is read back as it was. */
-#include "host/cimxml/Writer.h"
 #include "tests/cimxml/Documents.h"
 #include "tests/cimxml/Validity.h"
+#include "tests/cimxml/Written.h"
 
 #include <cmath>
 #include <limits>
@@ -15,15 +15,6 @@ using cimxml::Form;
 using cimxml::PathWrap;
 using cimxml::Wrap;
 using cimxml::Writer;
-
-template <typename Write>
-std::string written(Write write) {
-    std::string document;
-    Writer writer([&document](std::string_view piece) { document += piece; }, "host.example:5989");
-    write(writer);
-    writer.finish();
-    return document;
-}
 
 /** A whole answer around what is returned. */
 template <typename Write>

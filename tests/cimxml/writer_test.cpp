@@ -1,6 +1,6 @@
 /** @file What is written, byte by byte. */
-#include "host/cimxml/Writer.h"
 #include "tests/cimxml/Validity.h"
+#include "tests/cimxml/Written.h"
 
 #include <cmath>
 #include <limits>
@@ -14,16 +14,6 @@ namespace {
 using cimxml::PathWrap;
 using cimxml::Wrap;
 using cimxml::Writer;
-
-/** What a writer writes of one thing. */
-template <typename Write>
-std::string written(Write write) {
-    std::string document;
-    Writer writer([&document](std::string_view piece) { document += piece; }, "host.example");
-    write(writer);
-    writer.finish();
-    return document;
-}
 
 TEST(Writer, FramesAnIntrinsicAnswer) {
     EXPECT_EQ(written([](Writer& writer) {
