@@ -5,6 +5,7 @@
 #pragma once
 
 #include "tests/linux/TemporaryHost.h"
+#include "tests/support/Require.h"
 
 #include <atomic>
 #include <mutex>
@@ -66,11 +67,4 @@ class MockServices {
 } // namespace Orv::Test
 
 /** Goes on only where a bus can be: elsewhere the test is skipped with the reason, or fails under CI. */
-#define REQUIRE_BUS()                                                                                                \
-    if (const std::string why = Orv::Test::whyNoBus(); !why.empty()) {                                               \
-        if (std::getenv("CI") != nullptr) {                                                                          \
-            FAIL() << why;                                                                                           \
-        }                                                                                                            \
-        GTEST_SKIP() << why;                                                                                         \
-    }                                                                                                                \
-    static_assert(true, "a semicolon follows")
+#define REQUIRE_BUS() GO_ON_UNLESS(Orv::Test::whyNoBus())

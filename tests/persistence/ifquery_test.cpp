@@ -1,8 +1,8 @@
 #include "agent/persistence/Command.h"
 #include "agent/persistence/Ifupdown.h"
 #include "tests/persistence/Plans.h"
+#include "tests/support/Require.h"
 
-#include <cstdlib>
 #include <filesystem>
 #include <sstream>
 
@@ -18,14 +18,7 @@ using namespace Orv::Test;
 
 constexpr const char* ifquery = "/sbin/ifquery";
 
-#define REQUIRE_IFQUERY()                                                                                            \
-    if (!std::filesystem::exists(ifquery)) {                                                                         \
-        if (std::getenv("CI") != nullptr) {                                                                          \
-            FAIL() << "ifupdown is not installed";                                                                   \
-        }                                                                                                            \
-        GTEST_SKIP() << "ifupdown is not installed";                                                                 \
-    }                                                                                                                \
-    static_assert(true, "a semicolon follows")
+#define REQUIRE_IFQUERY() GO_ON_UNLESS(std::filesystem::exists(ifquery) ? "" : "ifupdown is not installed")
 
 /** What a query says of one key; empty when nothing. */
 std::string said(const std::string& output, const std::string& key) {

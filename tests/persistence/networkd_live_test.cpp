@@ -24,12 +24,7 @@ class NetworkdLiveTest : public WriteFixture {
   protected:
     void SetUp() override {
         REQUIRE_BUS();
-        if (!std::filesystem::exists(networkd)) {
-            if (std::getenv("CI") != nullptr) {
-                FAIL() << "systemd-networkd is not installed";
-            }
-            GTEST_SKIP() << "systemd-networkd is not installed";
-        }
+        GO_ON_UNLESS(std::filesystem::exists(networkd) ? "" : "systemd-networkd is not installed");
         WriteFixture::SetUp();
         if (!space) {
             return;

@@ -1,6 +1,6 @@
 #include "tests/security/Shell.h"
+#include "tests/support/Require.h"
 
-#include <cstdlib>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -12,12 +12,8 @@ using marlo::test::shell;
 class ServiceUnit : public testing::Test {
   protected:
     void SetUp() override {
-        if (const std::string version = shell("systemd-analyze --version"); !version.starts_with("systemd ")) {
-            if (std::getenv("CI") != nullptr) {
-                FAIL() << version;
-            }
-            GTEST_SKIP() << "systemd-analyze is not installed: " << version;
-        }
+        const std::string version = shell("systemd-analyze --version");
+        GO_ON_UNLESS(version.starts_with("systemd ") ? "" : "systemd-analyze is not installed: " + version);
     }
 };
 

@@ -4,12 +4,11 @@
  */
 #pragma once
 
-#include <cstdlib>
+#include "tests/support/Require.h"
+
 #include <filesystem>
 #include <functional>
 #include <string>
-
-#include <gtest/gtest.h>
 
 namespace Orv::Test {
 
@@ -67,11 +66,4 @@ class Namespace {
 } // namespace Orv::Test
 
 /** Goes on only where namespaces can be made: elsewhere the test is skipped with the reason, or fails under CI. */
-#define REQUIRE_NAMESPACES()                                                                                         \
-    if (const std::string why = Orv::Test::whyNoNamespaces(); !why.empty()) {                                        \
-        if (std::getenv("CI") != nullptr) {                                                                          \
-            FAIL() << why;                                                                                           \
-        }                                                                                                            \
-        GTEST_SKIP() << why;                                                                                         \
-    }                                                                                                                \
-    static_assert(true, "a semicolon follows")
+#define REQUIRE_NAMESPACES() GO_ON_UNLESS(Orv::Test::whyNoNamespaces())
