@@ -53,8 +53,10 @@ std::string own(const std::string& function, const std::string& text, int level 
     return line("log", level, INDICATION_LOGGER, "NetworkAdapterProvider", function, text);
 }
 
-std::vector<std::string> lookUp(const std::string& className, const std::string& id) {
-    return {entering("getNetworkIndicationId"), variable("getNetworkIndicationId", "classname", className),
+/** What a function says that looks up the class it was called for. */
+std::vector<std::string> lookUpBy(const std::string& function, const std::string& className, const std::string& id) {
+    return {own(function, "VARIABLE: 'className' has Value '" + className + "' at line N in NetworkAdapterProvider"),
+            entering("getNetworkIndicationId"), variable("getNetworkIndicationId", "classname", className),
             variable("getNetworkIndicationId", "indicationClassId", id)};
 }
 
@@ -133,10 +135,8 @@ TEST_F(IndicationMI, ActivationSavesBrokerAndPreparedContextAndStartsMonitoring)
     EXPECT_EQ(answer.code, CMPI_RC_OK);
     EXPECT_FALSE(answer.hasMessage);
     const std::string self = "NetworkAdapter_ActivateFilter";
-    std::vector<std::string> inside{
-        "broker: objectPath.getClassName", "broker: string.getCharPtr",
-        own(self, "VARIABLE: 'className' has Value '" + ONLINE + "' at line N in NetworkAdapterProvider")};
-    const std::vector<std::string> lookingUp = lookUp(ONLINE, "1");
+    std::vector<std::string> inside{"broker: objectPath.getClassName", "broker: string.getCharPtr"};
+    const std::vector<std::string> lookingUp = lookUpBy(self, ONLINE, "1");
     inside.insert(inside.end(), lookingUp.begin(), lookingUp.end());
     inside.insert(inside.end(),
                   {"broker: prepareAttachThread", entering("saveIndicationContext"), entering("subscribeforEvent"),
@@ -223,7 +223,19 @@ TEST_F(IndicationMI, AgentThatCannotMonitorDoesNotFailTheActivation) {
     EXPECT_TRUE(_alertContextAvailable);
 }
 
-class UnknownClasses : public IndicationMI, public testing::WithParamInterface<const char*> {};
+class UnknownClasses : public IndicationMI, public testing::WithParamInterface<const char*> {
+  protected:
+    /** The lines of a function that knows the class not, which it says with this word at the end. */
+    static std::vector<std::string> refusing(const std::string& function, const std::string& lastWord) {
+        std::vector<std::string> inside = lookUpBy(function, GetParam(), "15");
+        inside.push_back(own(function,
+                             "MESSAGE [File: NetworkAdapterProvider, Line: N]: "
+                             "The Given Class does not support " +
+                                 lastWord,
+                             6000));
+        return call(function, inside);
+    }
+};
 
 TEST_P(UnknownClasses, CannotBeActivatedAndChangeNothing) {
     const Answer answer = activate(GetParam());
@@ -234,16 +246,7 @@ TEST_P(UnknownClasses, CannotBeActivatedAndChangeNothing) {
     EXPECT_EQ(OnlineSubscribeCount, 0);
     EXPECT_THAT(agentCalls(), IsEmpty());
     EXPECT_THAT(brokerCalls(), IsEmpty());
-    const std::string self = "NetworkAdapter_ActivateFilter";
-    std::vector<std::string> inside{own(self, std::string("VARIABLE: 'className' has Value '") + GetParam() +
-                                                  "' at line N in NetworkAdapterProvider")};
-    const std::vector<std::string> lookingUp = lookUp(GetParam(), "15");
-    inside.insert(inside.end(), lookingUp.begin(), lookingUp.end());
-    inside.push_back(own(self,
-                         "MESSAGE [File: NetworkAdapterProvider, Line: N]: "
-                         "The Given Class does not support indication",
-                         6000));
-    EXPECT_EQ(log(), call(self, inside));
+    EXPECT_EQ(log(), refusing("NetworkAdapter_ActivateFilter", "indication"));
 }
 
 TEST_P(UnknownClasses, CannotBeDeactivatedWhichIsSaidWithACapitalLetter) {
@@ -254,16 +257,7 @@ TEST_P(UnknownClasses, CannotBeDeactivatedWhichIsSaidWithACapitalLetter) {
     EXPECT_FALSE(answer.hasMessage);
     EXPECT_EQ(OnlineSubscribeCount, 1);
     EXPECT_TRUE(_alertContextAvailable);
-    const std::string self = "NetworkAdapter_DeActivateFilter";
-    std::vector<std::string> inside{own(self, std::string("VARIABLE: 'className' has Value '") + GetParam() +
-                                                  "' at line N in NetworkAdapterProvider")};
-    const std::vector<std::string> lookingUp = lookUp(GetParam(), "15");
-    inside.insert(inside.end(), lookingUp.begin(), lookingUp.end());
-    inside.push_back(own(self,
-                         "MESSAGE [File: NetworkAdapterProvider, Line: N]: "
-                         "The Given Class does not support Indication",
-                         6000));
-    EXPECT_EQ(log(), call(self, inside));
+    EXPECT_EQ(log(), refusing("NetworkAdapter_DeActivateFilter", "Indication"));
 }
 
 INSTANTIATE_TEST_SUITE_P(All, UnknownClasses,
@@ -281,10 +275,7 @@ TEST_F(IndicationMI, DeactivationCountsDownAndKeepsTheContext) {
     EXPECT_TRUE(_enabledNetwork);
     EXPECT_THAT(agentCalls(), IsEmpty());
     const std::string self = "NetworkAdapter_DeActivateFilter";
-    std::vector<std::string> inside{
-        own(self, "VARIABLE: 'className' has Value '" + ONLINE + "' at line N in NetworkAdapterProvider")};
-    const std::vector<std::string> lookingUp = lookUp(ONLINE, "1");
-    inside.insert(inside.end(), lookingUp.begin(), lookingUp.end());
+    std::vector<std::string> inside = lookUpBy(self, ONLINE, "1");
     inside.push_back(entering("UnsubscribeforEvent"));
     EXPECT_EQ(log(), call(self, inside));
 }

@@ -2,8 +2,10 @@
  * The scan of the tree over a record that refuses what it is told to refuse: this file defines the record's members
  * in place of the provider's own.
  */
-#include "configuration/ConfigurationInventory.h"
+#include "tests/provider/InventoryRun.h"
 #include "tests/provider/Tree.h"
+
+#include <ostream>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -56,6 +58,7 @@ using namespace Orv::NodeLexicon;
 using Orv::NetworkAdapterComposite::getNetworkAdapterConfigurationInstances;
 using Orv::NetworkAdapterComposite::NetworkAdapterConfigurationMap;
 using provider_test::addFullAdapter;
+using provider_test::InventoryRun;
 using provider_test::line;
 using provider_test::normalised;
 using scripted_agent::recorded;
@@ -67,27 +70,18 @@ using testing::Not;
 struct Refusal {
     const char* setter;
     const char* message;
+
+    friend std::ostream& operator<<(std::ostream& stream, const Refusal& refusal) { return stream << refusal.setter; }
 };
 
-class RefusingRecord : public testing::TestWithParam<Refusal> {
+class RefusingRecord : public InventoryRun, public testing::TestWithParam<Refusal> {
   protected:
     RefusingRecord() {
-        scripted_agent::reset();
         setterLog.clear();
         refusing = GetParam().setter;
         addFullAdapter("eth0");
         addFullAdapter("eth1");
     }
-
-    unsigned short run() {
-        testing::internal::CaptureStderr();
-        const unsigned short result = getNetworkAdapterConfigurationInstances(map);
-        errors = testing::internal::GetCapturedStderr();
-        return result;
-    }
-
-    NetworkAdapterConfigurationMap map;
-    std::string errors;
 };
 
 using FatalRefusal = RefusingRecord;

@@ -1,4 +1,4 @@
-#include "configuration/ConfigurationInventory.h"
+#include "tests/provider/InventoryRun.h"
 #include "tests/provider/Tree.h"
 
 #include <stdexcept>
@@ -15,6 +15,7 @@ using Orv::NetworkAdapterComposite::NetworkAdapterConfigurationMap;
 using provider_test::addAdapter;
 using provider_test::addBareAdapter;
 using provider_test::addFullAdapter;
+using provider_test::InventoryRun;
 using provider_test::line;
 using provider_test::normalised;
 using scripted_agent::failAt;
@@ -34,21 +35,7 @@ std::vector<std::string> keys(const NetworkAdapterConfigurationMap& map) {
     return found;
 }
 
-/** Calls with what goes to the standard error stream in `errors`. */
-class Inventory : public testing::Test {
-  protected:
-    Inventory() { scripted_agent::reset(); }
-
-    unsigned short run() {
-        testing::internal::CaptureStderr();
-        const unsigned short result = getNetworkAdapterConfigurationInstances(map);
-        errors = testing::internal::GetCapturedStderr();
-        return result;
-    }
-
-    NetworkAdapterConfigurationMap map;
-    std::string errors;
-};
+class Inventory : public InventoryRun, public testing::Test {};
 
 TEST_F(Inventory, ReadsEveryPropertyInItsOrder) {
     addFullAdapter("eth0");

@@ -1,5 +1,5 @@
 /** InvokeMethod through the library's method table: the dispatch, the handlers behind it, and what they answer. */
-#include "tests/provider/Scene.h"
+#include "tests/provider/Changes.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -19,7 +19,6 @@ using scripted_agent::recorded;
 using scripted_agent::script;
 using testing::Contains;
 using testing::ElementsAre;
-using testing::EndsWith;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
@@ -28,12 +27,8 @@ using Arguments = std::vector<NamedValue>;
 
 const std::string CHANGE_FAILED = "Failed to Execute DHCP Changes";
 
-class Methods : public ReadBase, public testing::Test {
+class Methods : public ChangeBase, public testing::Test {
   protected:
-    static marlo::ObjectPath eth(const std::string& settingId) {
-        return instancePath(CONFIGURATION, {{"SettingID", settingId}});
-    }
-
     Answer invoke(const std::string& method, const Arguments& arguments = {}) {
         return invokeOn(eth("eth1"), method, arguments);
     }
@@ -44,27 +39,6 @@ class Methods : public ReadBase, public testing::Test {
         Answer answer = calls.invokeMethod(path, method, arguments);
         EXPECT_THAT(calls.outArguments, IsEmpty()) << "no method has results but its own";
         return answer;
-    }
-
-    /** The writes of the last call, in order, without the cursor. */
-    static std::vector<std::string> writes() {
-        std::vector<std::string> found;
-        for (const std::string& line : recorded("cursor")) {
-            if (const auto at = line.find("setProperty"); at != std::string::npos) {
-                found.push_back(line.substr(at));
-            }
-        }
-        return found;
-    }
-
-    /** The texts of the log at a level, each written to the trace as well. */
-    static std::vector<std::string> texts(int level) {
-        std::vector<std::string> found;
-        for (const std::string& line : normalised(recorded("log " + std::to_string(level)))) {
-            found.push_back(line.substr(line.find(" | ") + 3));
-        }
-        EXPECT_THAT(recorded("trace " + std::to_string(level)), SizeIs(found.size()));
-        return found;
     }
 
     static std::vector<std::string> failures() {

@@ -1,5 +1,5 @@
 /** ModifyInstance of the configuration class through the library's instance table. */
-#include "tests/provider/Scene.h"
+#include "tests/provider/Changes.h"
 
 #include <stdexcept>
 
@@ -23,14 +23,10 @@ using testing::IsEmpty;
 using testing::Not;
 using testing::SizeIs;
 
-class ModifyInstance : public ReadBase, public testing::Test {
+class ModifyInstance : public ChangeBase, public testing::Test {
   protected:
     ~ModifyInstance() override {
         EXPECT_THAT(recorded("log"), Not(Contains(HasSubstr("markProviderExit")))) << "there is no exit mark, ever";
-    }
-
-    static marlo::ObjectPath eth(const std::string& settingId) {
-        return instancePath(CONFIGURATION, {{"SettingID", settingId}});
     }
 
     /** An instance with all that can be changed. */
@@ -60,25 +56,6 @@ class ModifyInstance : public ReadBase, public testing::Test {
         scripted_agent::clearRecord();
         setup.faulty.forgetCalls();
         return calls.modifyInstance(path, instance, std::move(properties));
-    }
-
-    static std::vector<std::string> writes() {
-        std::vector<std::string> found;
-        for (const std::string& line : recorded("cursor")) {
-            if (const auto at = line.find("setProperty"); at != std::string::npos) {
-                found.push_back(line.substr(at));
-            }
-        }
-        return found;
-    }
-
-    static std::vector<std::string> texts(int level) {
-        std::vector<std::string> found;
-        for (const std::string& line : normalised(recorded("log " + std::to_string(level)))) {
-            found.push_back(line.substr(line.find(" | ") + 3));
-        }
-        EXPECT_THAT(recorded("trace " + std::to_string(level)), SizeIs(found.size()));
-        return found;
     }
 
     static std::string factoryVariable(const std::string& name, const std::string& value) {
