@@ -255,8 +255,8 @@ TEST(Script, RefusesWhatItDoesNotUnderstand) {
         {"flap eth9", "there is no adapter \"eth9\""},
         {"flap \x01", "there is no adapter \" \""},
     };
-    for (const auto& [line, reason] : refusals) {
-        EXPECT_EQ(messageOf([&] { play(line, *lab()); }), std::string("control pipe: ") + reason);
+    for (const Refusal& refusal : refusals) {
+        EXPECT_EQ(messageOf([&] { play(refusal.line, *lab()); }), std::string("control pipe: ") + refusal.reason);
     }
 }
 

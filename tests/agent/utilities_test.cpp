@@ -21,9 +21,9 @@ struct CmpiTest : testing::Test {
         return pathOf({host, "root/test", "Thing", std::move(keys)});
     }
 
-    const marlo::test::StaticSchema schema;
+    const marlo::test::StaticSchema schema{};
     const marlo::broker::Broker broker{schema};
-    const marlo::broker::CallScope scope;
+    const marlo::broker::CallScope scope{};
 };
 
 NamedValue text(const std::string& name, const std::string& value) {
