@@ -55,7 +55,7 @@ TEST_F(Answers, ThatAreWrittenGoOutInChunksWhereTheyAreLong) {
 }
 
 TEST_F(Answers, OfAnyLengthArriveWhole) {
-    for (const std::size_t size : {0, 1, 65535, 65536, 65537, 1000000, 10000000}) {
+    for (const std::size_t size : {0U, 1U, 65535U, 65536U, 65537U, 1000000U, 10000000U}) {
         endServer();
         write(size);
         RawClient asking = clientOf(0);
@@ -270,7 +270,7 @@ class LateAcknowledgements : public Answers {
 };
 
 TEST_F(LateAcknowledgements, DoNotHoldUpAnswersOfAnySize) {
-    for (const std::size_t size : {10, 3000, 50000, 70000, 150000}) {
+    for (const std::size_t size : {10U, 3000U, 50000U, 70000U, 150000U}) {
         write(size);
         EXPECT_LT(timeOf([](RawClient& asking) { asking.send(get()); }), bound) << size;
         endServer();

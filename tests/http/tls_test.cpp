@@ -92,7 +92,7 @@ TEST_F(Tls, CarriesBodiesOfAnySize) {
         responder.write(request.body);
         responder.finish();
     };
-    for (const std::size_t size : {1, 16384, 16385, 65000, 1000000}) {
+    for (const std::size_t size : {1U, 16384U, 16385U, 65000U, 1000000U}) {
         const std::string body(size, 'b');
         TlsClient asking = tlsClient();
         asking.send("POST / HTTP/1.0\r\nContent-Length: " + std::to_string(size) + "\r\n\r\n" + body);

@@ -99,10 +99,10 @@ std::vector<Counters> Delivery::counters() const {
         counters.destination = key;
         counters.url = destination.url;
         counters.sequenceContext = "context " + key;
-        counters.sent = static_cast<std::uint64_t>(
-            std::count_if(_state->script->posts.begin(), _state->script->posts.end(), [&](const auto& post) {
+        counters.sent = static_cast<std::uint64_t>(std::count_if(
+            _state->script->posts.begin(), _state->script->posts.end(), [&, to = key](const auto& post) {
                 const auto known = _state->script->subscriptions.find(post.first);
-                return known != _state->script->subscriptions.end() && known->second.destination == key;
+                return known != _state->script->subscriptions.end() && known->second.destination == to;
             }));
         all.push_back(std::move(counters));
     }
