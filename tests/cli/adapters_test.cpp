@@ -54,7 +54,7 @@ TEST_F(MarloAdapters, AreJsonWithTheStatusBesideTheConfiguration) {
     EXPECT_EQ(json[0]["path"], "root/tavis:MARLO_NetworkAdapterConfiguration.SettingID=\"bond0\"");
     EXPECT_EQ(json[0]["class"], "MARLO_NetworkAdapterConfiguration");
     EXPECT_EQ(json[0]["properties"]["Status"], "OK");
-    EXPECT_EQ(json[0]["properties"]["IPAddress"], nlohmann::json::array({"192.0.2.10", "2001:db8:0:2::10"}));
+    EXPECT_EQ(json[0]["properties"]["IPAddress"], nlohmann::ordered_json::array({"192.0.2.10", "2001:db8:0:2::10"}));
     EXPECT_EQ(json[2]["properties"]["Status"], "Lost Comm");
     EXPECT_EQ(json[1]["properties"]["DHCPEnabled"], true);
 }
@@ -62,7 +62,7 @@ TEST_F(MarloAdapters, AreJsonWithTheStatusBesideTheConfiguration) {
 TEST_F(MarloAdapters, AreJsonOfThePropertiesThatAreAskedFor) {
     const auto json = marloJson({"adapters", "-p", "Status"});
     ASSERT_EQ(json.size(), 4U);
-    EXPECT_EQ(json[0]["properties"], (nlohmann::json{{"Status", "OK"}}));
+    EXPECT_EQ(json[0]["properties"], (nlohmann::ordered_json{{"Status", "OK"}}));
 }
 
 TEST_F(MarloAdapters, AreJsonWithNULLForWhatIsAskedForAndTheyLack) {

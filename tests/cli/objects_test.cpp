@@ -47,7 +47,7 @@ TEST_F(MarloObjects, AreJsonWithPathClassAndProperties) {
     EXPECT_EQ(json[1]["path"], std::string("root/tavis:") + EthPath);
     EXPECT_EQ(json[1]["properties"]["SettingID"], "eth0");
     EXPECT_EQ(json[1]["properties"]["DHCPEnabled"], true);
-    EXPECT_EQ(json[1]["properties"]["DefaultIPGateway"], nlohmann::json::array({"198.51.100.1"}));
+    EXPECT_EQ(json[1]["properties"]["DefaultIPGateway"], nlohmann::ordered_json::array({"198.51.100.1"}));
 }
 
 TEST_F(MarloObjects, HaveTheOrderOfTheirClass) {
@@ -70,8 +70,8 @@ TEST_F(MarloObjects, ShowWhatIsAskedForAndMissingAsNULL) {
     EXPECT_THAT(marlo({"get", EthPath, "-p", "dnsdomain,SettingID"}).out,
                 testing::EndsWith("\n  SettingID = \"eth0\"\n  DNSDomain = NULL\n"));
     const auto json = marloJson({"enum", Configuration, "-p", "DNSDomain"});
-    EXPECT_EQ(json[0]["properties"], (nlohmann::json{{"DNSDomain", "lab.example.org"}}));
-    EXPECT_EQ(json[1]["properties"], (nlohmann::json{{"DNSDomain", nullptr}}));
+    EXPECT_EQ(json[0]["properties"], (nlohmann::ordered_json{{"DNSDomain", "lab.example.org"}}));
+    EXPECT_EQ(json[1]["properties"], (nlohmann::ordered_json{{"DNSDomain", nullptr}}));
 }
 
 TEST_F(MarloObjects, LackWhatOnlyADerivedClassHas) {
@@ -89,7 +89,7 @@ TEST_F(MarloObjects, LackWhatOnlyADerivedClassHas) {
 TEST_F(MarloObjects, TakePropertyNamesInAnyCase) {
     const auto json = marloJson({"get", EthPath, "-p", "macaddress"});
     ASSERT_EQ(json.size(), 1U);
-    EXPECT_EQ(json[0]["properties"], (nlohmann::json{{"MACAddress", "02:00:5e:10:00:02"}}));
+    EXPECT_EQ(json[0]["properties"], (nlohmann::ordered_json{{"MACAddress", "02:00:5e:10:00:02"}}));
 }
 
 TEST_F(MarloObjects, OfTheOtherClassesAreServed) {
@@ -119,7 +119,7 @@ TEST_F(MarloObjects, AreNamedInJsonWithTheirKeys) {
     const auto json = marloJson({"names", Configuration});
     ASSERT_EQ(json.size(), 4U);
     EXPECT_THAT(namesOf(json[0]), ElementsAre("path", "class", "keys"));
-    EXPECT_EQ(json[0]["keys"], (nlohmann::json{{"SettingID", "bond0"}}));
+    EXPECT_EQ(json[0]["keys"], (nlohmann::ordered_json{{"SettingID", "bond0"}}));
 }
 
 TEST_F(MarloObjects, AreFoundAgainUnderEachNameThatIsPrinted) {
@@ -165,7 +165,7 @@ TEST_F(MarloFixture, ValuesKeepTheirTypesInJson) {
     EXPECT_EQ(properties["Character"], "\xE2\x82\xAC");
     EXPECT_EQ(properties["When"], "20250102030405.000000+060");
     EXPECT_EQ(properties["Text"], "tab\there\nand \x1b[31mred\x1b[0m");
-    EXPECT_EQ(properties["Texts"], nlohmann::json::array({"first, with a comma", nullptr, "\xC3\xA4"}));
+    EXPECT_EQ(properties["Texts"], nlohmann::ordered_json::array({"first, with a comma", nullptr, "\xC3\xA4"}));
     ASSERT_TRUE(properties.contains("Nothing"));
     EXPECT_TRUE(properties["Nothing"].is_null());
     EXPECT_THAT(properties["Other"].get<std::string>(), HasSubstr(R"(TEST_Typed.Id="one \"quoted\" \\ key")"));
