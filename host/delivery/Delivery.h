@@ -77,6 +77,7 @@ struct Options {
     std::chrono::milliseconds firstRetry{1000};              ///< doubled with each failure in a row,
     std::chrono::milliseconds lastRetry{60000};              ///< up to this; spread by a fifth both ways
     std::chrono::milliseconds deletionTime{250};             ///< after which answered ones leave the disk, together
+    std::chrono::milliseconds shrinkTime{1000}; ///< after that, the file is made smaller if it is worth it
 };
 
 /**
@@ -138,6 +139,7 @@ class Delivery {
     /**
      * Begins to send. Destinations and subscriptions that were not set before are forgotten with what waits for
      * them: whoever keeps the subscriptions sets them all first. Until then posts are kept, and nothing is sent.
+     * Throws as setDestination() does.
      */
     void start();
 

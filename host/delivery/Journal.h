@@ -64,6 +64,9 @@ class Journal {
 
     void write(const Batch& batch);
 
+    /** Makes the file smaller where it is worth it; others who write wait meanwhile. */
+    void shrink() { _writer.shrink(); }
+
     /** The text of an event; throws store::Error as well when there is none. */
     std::string read(std::int64_t event);
 

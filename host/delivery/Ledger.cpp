@@ -28,6 +28,7 @@ Ledger::Turn::~Turn() {
 Ledger::Ledger(const std::filesystem::path& file, const Options& options, Delivery::Log log, Wake wake)
     : _options(options), _log(std::move(log)), _wake(std::move(wake)), _journal(file) {
     restore();
+    _shrinkDue = Clock::now() + _options.shrinkTime; // a former process may have had no time for it
     _keeper = std::thread([this] { keep(); });
 }
 

@@ -106,6 +106,7 @@ class Ledger {
     void keep();
     [[nodiscard]] std::optional<Clock::time_point> due() const;
     void write(Lock& lock);
+    void shrink(Lock& lock);
     Batch takeBatch();
     std::vector<LaneId> settle(const Batch& batch);
     void revoke(const Batch& batch, const std::string& reason, Delivery::Ticket upTo);
@@ -146,7 +147,8 @@ class Ledger {
     std::deque<Refusal> _refusals;
     std::optional<Clock::time_point> _pendingSince;
     std::optional<Clock::time_point> _removalsSince;
-    Clock::time_point _notBefore; ///< after a write that failed, the keeper waits
+    std::optional<Clock::time_point> _shrinkDue; ///< the file may have room that nobody needs
+    Clock::time_point _notBefore;                ///< after a write that failed, the keeper waits
     bool _isWriting = false;
     bool _isDiskFailing = false;
     bool _isRefusing = false;

@@ -12,6 +12,7 @@ constexpr std::size_t removalsWithPosts = 64; ///< so many are worth being writt
 constexpr std::size_t removalsAlone = 512;    ///< so many are not kept waiting for a post
 constexpr std::size_t removalsAtOnce = 256;   ///< so that nobody who posts waits long for them
 constexpr std::chrono::seconds afterFailure{1};
+constexpr std::chrono::minutes afterShrinkFailure{10};
 
 std::int64_t microsecondsNow() {
     const auto now = std::chrono::system_clock::now().time_since_epoch();
@@ -189,6 +190,9 @@ std::vector<Ledger::LaneId> Ledger::settle(const Batch& batch) {
     if (std::exchange(_isDiskFailing, false)) {
         _log("delivery: indications are kept on disk again");
     }
+    if (!batch.removals.empty() && !_shrinkDue) {
+        _shrinkDue = Clock::now() + _options.shrinkTime;
+    }
     std::vector<LaneId> lanes;
     for (const auto& [destination, item] : batch.items) {
         Lane* lane = laneOf(destination);
@@ -244,13 +248,35 @@ std::optional<Ledger::Clock::time_point> Ledger::due() const {
         const bool isMany = _removals.size() >= removalsAlone;
         earliest = std::min(earliest, isMany ? *_removalsSince : *_removalsSince + _options.deletionTime);
     }
+    earliest = std::min(earliest, _shrinkDue.value_or(earliest));
     if (earliest == Clock::time_point::max()) {
         return std::nullopt;
     }
     return std::max(earliest, _notBefore);
 }
 
-/** Writes what nobody waits for: what was answered, and posts whose ticket is not asked for. */
+/** Whoever posts meanwhile waits, for as long as what is left takes to be copied. */
+void Ledger::shrink(Lock& lock) {
+    const Turn turn(*this, lock);
+    _shrinkDue.reset();
+    lock.unlock();
+    std::string problem;
+    try {
+        _journal.shrink();
+    } catch (const std::exception& error) {
+        problem = error.what();
+    }
+    lock.lock();
+    if (!problem.empty()) {
+        _shrinkDue = Clock::now() + afterShrinkFailure;
+        _log("delivery: the database stays as large as it is: " + problem);
+    }
+}
+
+/**
+ * Writes what nobody waits for: what was answered, and posts whose ticket is not asked for. And sees to it that the
+ * file does not stay as large as its largest backlog.
+ */
 void Ledger::keep() {
     Lock lock(_mutex);
     while (!_isEnding) {
@@ -259,6 +285,8 @@ void Ledger::keep() {
             _keeperWakes.wait(lock);
         } else if (*time > Clock::now()) {
             _keeperWakes.wait_until(lock, *time);
+        } else if (_shrinkDue && *_shrinkDue <= Clock::now()) {
+            shrink(lock);
         } else {
             write(lock);
         }

@@ -17,6 +17,10 @@ constexpr std::int64_t format = 1;
 constexpr std::string_view settings =
     "PRAGMA synchronous = FULL; PRAGMA foreign_keys = ON; PRAGMA cache_size = -1024;";
 
+// In pages of 4 KiB.
+constexpr std::int64_t leastFree = 1024; ///< less is soon filled again
+constexpr std::int64_t mostLeft = 2048;  ///< so that other writers wait for a fraction of a second
+
 /**
  * Made for the owner alone; SQLite gives the files beside it the same mode. A file that exists is not opened here:
  * closing it again would release the locks that this process has on it.
@@ -134,6 +138,16 @@ void Database::script(std::string_view sql) {
     const std::string text(sql);
     if (sqlite3_exec(_handle.get(), text.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) {
         fail(text);
+    }
+}
+
+/** The file itself is cut when all of the log has come into it, for which those who read have to end. */
+void Database::shrink() {
+    const std::int64_t free = query("PRAGMA freelist_count").firstInteger();
+    const std::int64_t left = query("PRAGMA page_count").firstInteger() - free;
+    if (free >= leastFree && left <= free / 3 && left <= mostLeft) {
+        run("VACUUM");
+        run("PRAGMA wal_checkpoint(RESTART)");
     }
 }
 

@@ -149,6 +149,13 @@ class Database {
     /** Runs any number of statements without parameters. */
     void script(std::string_view sql);
 
+    /**
+     * Gives the room of what was removed back to the file system, by writing what is left anew (VACUUM). Only where
+     * the file is large, most of it is free, and what is left is soon written; else it does nothing, at next to no
+     * cost. Not within a transaction or a query. Other connections go on. Throws Error: the file is as it was.
+     */
+    void shrink();
+
     [[nodiscard]] std::int64_t lastInserted() const; ///< the row id of the last row that was inserted
     [[nodiscard]] std::int64_t changes() const;      ///< rows that the last statement changed
 

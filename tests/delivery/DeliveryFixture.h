@@ -40,6 +40,7 @@ class DeliveryFixture : public testing::Test {
         options.firstRetry = std::chrono::milliseconds(10);
         options.lastRetry = std::chrono::milliseconds(40);
         options.deletionTime = std::chrono::milliseconds(20);
+        options.shrinkTime = std::chrono::milliseconds(20);
         return options;
     }
 

@@ -19,6 +19,9 @@ class Kept : public DeliveryFixture {
         return database.query("SELECT count(*) FROM " + table).firstInteger();
     }
 
+    /** Of the database without its log, in KiB. */
+    std::uintmax_t sizeOnDisk() const { return std::filesystem::file_size(file) / 1024; }
+
     void expectEmptyTables() const {
         EXPECT_TRUE(eventually([this] { return rows("delivery_item") == 0 && rows("delivery_event") == 0; }));
     }
@@ -264,6 +267,43 @@ TEST_F(Kept, AStopSendsWhatItCanAndKeepsTheRest) {
     delivery = openFor(listener);
     ASSERT_TRUE(eventually([&] { return listener.numbers().back() == 54; }));
     EXPECT_EQ(once(listener.numbers()), upTo(55));
+}
+
+TEST_F(Kept, ABacklogThatIsDeliveredLeavesASmallFile) {
+    Listener listener(Listener::refuse);
+    auto delivery = openFor(listener);
+    for (int number = 0; number < 300; ++number) {
+        delivery->post(std::vector<std::string>{"a"}, alert(std::to_string(number) + std::string(40000, 'x')));
+    }
+    post(*delivery, 300, 1);
+    store::Database(file).script("PRAGMA wal_checkpoint(RESTART)");
+    EXPECT_GT(sizeOnDisk(), 10000U);
+    listener.setReaction(Listener::accept);
+    ASSERT_TRUE(eventually([&] { return countersOf(*delivery).sent == 301; }));
+    EXPECT_TRUE(eventually([&] { return sizeOnDisk() < 1000; })) << sizeOnDisk();
+    post(*delivery, 301, 20); // what was made smaller goes on being written
+    delivery.reset();
+    delivery = openFor(listener);
+    post(*delivery, 321, 1);
+    ASSERT_TRUE(eventually([&] { return listener.numbers().back() == 321; }));
+    EXPECT_EQ(once(listener.numbers()), upTo(322));
+    EXPECT_FALSE(isLogged("stays as large as it is"));
+}
+
+/** As a process leaves it that ends right behind a backlog, or that never gave anything back. */
+TEST_F(Kept, AFileThatIsLargeForNothingIsMadeSmallAfterTheStart) {
+    {
+        open();
+        store::Database database(file);
+        database.script("CREATE TABLE ballast (bytes BLOB); INSERT INTO ballast VALUES (zeroblob(10000000))");
+        database.script("DROP TABLE ballast; PRAGMA wal_checkpoint(RESTART)");
+    }
+    EXPECT_GT(sizeOnDisk(), 9000U);
+    const Listener listener;
+    const auto delivery = openFor(listener);
+    EXPECT_TRUE(eventually([&] { return sizeOnDisk() < 1000; })) << sizeOnDisk();
+    post(*delivery, 0, 1);
+    EXPECT_TRUE(listener.await(1));
 }
 
 TEST_F(Kept, TwoProcessesCannotDeliverFromOneDatabase) {

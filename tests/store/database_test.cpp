@@ -199,6 +199,84 @@ TEST_F(Store, SaysWhyAFileCannotBeMade) {
     }
 }
 
+/** A file with rows of a page and more each, of which the last ones are left. */
+class Shrinking : public Store {
+  protected:
+    void SetUp() override { database.migrate("larder", bothSteps); }
+
+    void fill(int count) {
+        Transaction transaction(database);
+        const std::string bytes(5000, 'x');
+        for (int number = 0; number < count; ++number) {
+            database.run("INSERT INTO fruit VALUES (?, ?, ?)", std::to_string(number), std::int64_t{number},
+                         Blob{bytes});
+        }
+        transaction.commit();
+    }
+
+    void removeBelow(int number) { database.run("DELETE FROM fruit WHERE count < ?", std::int64_t{number}); }
+
+    /** In KiB, with all of the log in it. */
+    std::uintmax_t size() {
+        database.script("PRAGMA wal_checkpoint(RESTART)");
+        return std::filesystem::file_size(file) / 1024;
+    }
+
+    Database database{file};
+};
+
+TEST_F(Shrinking, GivesTheRoomBackOfWhatWasRemoved) {
+    fill(2000);
+    removeBelow(1990);
+    const std::uintmax_t before = size();
+    EXPECT_GT(before, 10000U);
+    database.shrink();
+    EXPECT_LT(std::filesystem::file_size(file) / 1024, 200U);
+    EXPECT_EQ(database.query("SELECT count(*) FROM fruit WHERE length(skin) = 5000").firstInteger(), 10);
+    EXPECT_EQ(Database(file).query("SELECT count(*) FROM fruit").firstInteger(), 10);
+    fill(100);
+    EXPECT_EQ(database.query("SELECT count(*) FROM fruit").firstInteger(), 110);
+}
+
+TEST_F(Shrinking, GoesOnWhileOthersHaveTheFile) {
+    fill(2000);
+    removeBelow(1990);
+    Database other(file);
+    EXPECT_EQ(other.query("SELECT count(*) FROM fruit").firstInteger(), 10);
+    database.shrink();
+    EXPECT_LT(std::filesystem::file_size(file) / 1024, 200U);
+    other.run("DELETE FROM fruit");
+    EXPECT_EQ(database.query("SELECT count(*) FROM fruit").firstInteger(), 0);
+}
+
+TEST_F(Shrinking, LeavesAFileOfWhichMuchIsLeft) {
+    fill(2000);
+    removeBelow(1000);
+    const std::uintmax_t before = size();
+    database.shrink();
+    EXPECT_EQ(size(), before);
+}
+
+/** Others who write would wait too long. */
+TEST_F(Shrinking, LeavesWhatTakesLongToWriteAnew) {
+    for (const char* rest : {"8600000", "8000000"}) {
+        database.script("DELETE FROM fruit; INSERT INTO fruit VALUES ('rest', 1, zeroblob(" + std::string(rest) +
+                        ")), ('much', 2, zeroblob(30000000)); DELETE FROM fruit WHERE name = 'much'");
+        const std::uintmax_t before = size();
+        database.shrink();
+        EXPECT_EQ(size() == before, std::string(rest) == "8600000") << size();
+    }
+}
+
+TEST_F(Shrinking, LeavesAFileThatIsSmall) {
+    fill(400);
+    removeBelow(400);
+    const std::uintmax_t before = size();
+    EXPECT_GT(before, 2000U);
+    database.shrink();
+    EXPECT_EQ(size(), before);
+}
+
 TEST_F(Store, LetsWritersWaitForOneAnother) {
     Database(file).migrate("tally", std::array{"CREATE TABLE tally (count INTEGER); INSERT INTO tally VALUES (0)"sv});
     std::vector<std::thread> writers;
