@@ -11,11 +11,11 @@ constexpr std::chrono::seconds idleTime{30};
 
 } // namespace
 
-Client::Client(Network& network, const Options& options, const Destination& destination)
+Client::Client(Network& network, const Options& options, const Destination& destination, TlsClient tls)
     : _network(network),
       _options(options),
       _url(Url::parse(destination.url)),
-      _tls(_url.isSecure ? network.trust().of(destination) : nullptr),
+      _tls(std::move(tls)),
       _isVerified(destination.isVerified),
       _timer(network) {}
 

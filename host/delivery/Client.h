@@ -24,8 +24,8 @@ class Client : public std::enable_shared_from_this<Client> {
     /** Empty: the listener has answered that the indication has arrived; else why it is not known to have. */
     using Done = std::function<void(const std::string& problem)>;
 
-    /** The first two outlive this. Throws std::invalid_argument as Url and Trust do. */
-    Client(Network& network, const Options& options, const Destination& destination);
+    /** The first two outlive this. `tls` is null for plain HTTP. Throws std::invalid_argument as Url does. */
+    Client(Network& network, const Options& options, const Destination& destination, TlsClient tls);
     ~Client(); ///< closes
     Client(const Client&) = delete;
     Client& operator=(const Client&) = delete;
@@ -62,8 +62,8 @@ class Client : public std::enable_shared_from_this<Client> {
     Network& _network;
     const Options& _options;
     const Url _url;
-    TlsClient _tls;
-    bool _isVerified;
+    const TlsClient _tls;
+    const bool _isVerified;
     Timer _timer; ///< for looking up the name, and for a connection that is idle
     std::shared_ptr<Connection> _connection;
     std::uint64_t _turn = 0;

@@ -20,7 +20,7 @@ class Delivery::State {
           ledger(database, options, log, [this](const std::vector<LaneId>& lanes) { wake(lanes); }),
           policies(std::move(onPolicy), log) {}
 
-    /** Any thread, as the next two. */
+    /** Any thread, as all below. */
     void wake(const std::vector<LaneId>& lanes) {
         if (!isSending) {
             return;
@@ -34,16 +34,21 @@ class Delivery::State {
         });
     }
 
-    void direct(LaneId lane, const Destination& destination) {
+    /** Whom a destination is believed by; null for one without TLS. Throws std::invalid_argument. */
+    TlsClient trustFor(const Destination& destination) {
+        return Url::parse(destination.url).isSecure ? network.trust().of(destination) : nullptr;
+    }
+
+    void direct(LaneId lane, const Destination& destination, const TlsClient& tls) {
         if (!isSending) {
             return;
         }
-        network.post([this, lane, destination] {
+        network.post([this, lane, destination, tls] {
             const auto onPolicy = [this](const std::string& subscription, OnFatalError policy) {
                 policies.fire(subscription, policy);
             };
             senders.try_emplace(lane, network, ledger, options, lane, onPolicy)
-                .first->second.setDestination(destination);
+                .first->second.setDestination(destination, tls);
         });
     }
 
@@ -71,10 +76,8 @@ Delivery::~Delivery() {
 
 /** What would fail for good is found now, and not when there is something to send. */
 void Delivery::setDestination(const Destination& destination) {
-    if (Url::parse(destination.url).isSecure) {
-        _state->network.trust().of(destination);
-    }
-    _state->direct(_state->ledger.setDestination(destination), destination);
+    const TlsClient tls = _state->trustFor(destination);
+    _state->direct(_state->ledger.setDestination(destination), destination, tls);
 }
 
 void Delivery::removeDestination(const std::string& key) {
@@ -104,7 +107,7 @@ void Delivery::start() {
     _state->network.start();
     _state->isSending = true;
     for (const auto& [lane, destination] : destinations) {
-        _state->direct(lane, destination);
+        _state->direct(lane, destination, _state->trustFor(destination));
     }
 }
 

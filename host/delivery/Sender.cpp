@@ -24,13 +24,13 @@ Sender::Sender(Network& network, Ledger& ledger, const Options& options, Ledger:
       _policy(std::move(policy)),
       _pause(network) {}
 
-void Sender::setDestination(const Destination& destination) {
+void Sender::setDestination(const Destination& destination, const TlsClient& tls) {
     if (_isBusy) {
         _client->close();
         _isBusy = false;
         _ledger.giveBack(_lane);
     }
-    _client = std::make_shared<Client>(_network, _options, destination);
+    _client = std::make_shared<Client>(_network, _options, destination, tls);
     _pause.cancel();
     _isPausing = false;
     _failures = 0;

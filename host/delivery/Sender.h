@@ -22,8 +22,8 @@ class Sender {
     /** All outlive this. */
     Sender(Network& network, Ledger& ledger, const Options& options, Ledger::LaneId lane, Policy policy);
 
-    /** Begins or begins anew, with another place to send to; a pause after failures ends. */
-    void setDestination(const Destination& destination);
+    /** Begins or begins anew, with another place to send to; a pause after failures ends. `tls` as of Client. */
+    void setDestination(const Destination& destination, const TlsClient& tls);
 
     /** There may be something to send. */
     void wake();

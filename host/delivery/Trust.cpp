@@ -5,6 +5,7 @@
 #include <stdexcept>
 
 #include <openssl/ssl.h>
+#include <sys/stat.h>
 
 namespace marlo::delivery {
 namespace {
@@ -32,13 +33,26 @@ TlsClient make(const Destination& destination) {
 
 } // namespace
 
+/** All zeros for no file. */
+Trust::Stamp Trust::stampOf(const std::string& file) {
+    struct stat status {};
+
+    if (file.empty() || ::stat(file.c_str(), &status) != 0) {
+        return {};
+    }
+    return {static_cast<std::int64_t>(status.st_dev), static_cast<std::int64_t>(status.st_ino), status.st_size,
+            status.st_mtim.tv_sec, status.st_mtim.tv_nsec};
+}
+
 TlsClient Trust::of(const Destination& destination) {
+    const std::string file = destination.isVerified ? destination.authorityFile : "";
+    const Stamp stamp = stampOf(file); // before it is read: a later one has another stamp
     const std::lock_guard lock(_mutex);
-    auto& known = _known[{destination.isVerified, destination.isVerified ? destination.authorityFile : ""}];
-    TlsClient shared = known.lock();
-    if (!shared) {
+    Known& known = _known[{destination.isVerified, file}];
+    TlsClient shared = known.client.lock();
+    if (!shared || known.stamp != stamp) {
         shared = make(destination);
-        known = shared;
+        known = {stamp, shared};
     }
     return shared;
 }

@@ -4,6 +4,7 @@
 #include <array>
 #include <atomic>
 #include <cerrno>
+#include <csignal>
 #include <stdexcept>
 
 #include <arpa/inet.h>
@@ -161,7 +162,12 @@ void Listener::listen() {
     }
 }
 
+/** TLS writes to peers that are gone as well: that must not end the process. */
 void Listener::serve(http::Descriptor descriptor, int connection) {
+    sigset_t signals;
+    ::sigemptyset(&signals);
+    ::sigaddset(&signals, SIGPIPE);
+    ::pthread_sigmask(SIG_BLOCK, &signals, nullptr);
     Stream stream(descriptor.get(), _tls.get());
     bool goesOn = stream.handshake();
     while (goesOn) {

@@ -79,6 +79,25 @@ TEST_F(SecureListeners, KeepTheirConnection) {
     EXPECT_EQ(listener.connections(), 1);
 }
 
+TEST_F(SecureListeners, AreBelievedByWhatTheFileOfAuthoritiesSaysNow) {
+    const Listener::Identity files = identity({"localhost"});
+    const Listener listener(Listener::accept, files);
+    const security::Key other = security::makeKey();
+    const std::string authorities = directory.file("authorities.pem");
+    std::ofstream(authorities) << security::toPem(
+        security::makeCertificate(other, {"localhost"}, std::chrono::hours(24)));
+    const auto delivery = open();
+    const Destination destination{"a", listener.url("localhost"), true, authorities};
+    delivery->setDestination(destination);
+    delivery->setSubscription({"a", "a", OnFatalError::ignore, {}});
+    delivery->start();
+    post(*delivery, 0, 1);
+    ASSERT_TRUE(eventually([&] { return countersOf(*delivery).retried > 0; }));
+    std::filesystem::copy(files.certificateFile, authorities, std::filesystem::copy_options::overwrite_existing);
+    delivery->setDestination(destination);
+    EXPECT_TRUE(listener.await(1));
+}
+
 TEST_F(SecureListeners, ThatSpeakPlainHttpAreTriedAgain) {
     options.connectTime = std::chrono::milliseconds(200);
     const Listener listener;
