@@ -246,6 +246,7 @@ void Daemon::State::takeConfiguration(const Configuration& fresh) {
     if (tls) {
         freshTls = findCertificate(fresh);
     }
+    Indications::check(fresh.indications);
     if (!options.trial && ::geteuid() == 0) {
         gatekeeper->setAccess(fresh.access);
     }

@@ -1,5 +1,6 @@
 #include "host/server/Indications.h"
 
+#include "host/delivery/Trust.h"
 #include "host/delivery/Url.h"
 #include "host/security/WholeFile.h"
 #include "host/subscriptions/Service.h"
@@ -56,6 +57,12 @@ Indications::Indications(ObjectManager& manager, const IndicationOptions& config
 
 Indications::~Indications() {
     stop(std::chrono::milliseconds(0));
+}
+
+void Indications::check(const IndicationOptions& configuration) {
+    if (!configuration.authorityFile.empty()) {
+        delivery::Trust().of({{}, {}, true, configuration.authorityFile});
+    }
 }
 
 void Indications::configure(const IndicationOptions& configuration) {

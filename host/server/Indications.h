@@ -37,6 +37,9 @@ class Indications {
     Indications(const Indications&) = delete;
     Indications& operator=(const Indications&) = delete;
 
+    /** Throws std::invalid_argument that says what is wrong with the file of authorities. */
+    static void check(const IndicationOptions& configuration);
+
     /** Other users or authorities from now on; limits stay. */
     void configure(const IndicationOptions& configuration);
 
