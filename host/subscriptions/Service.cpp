@@ -118,23 +118,32 @@ void Service::activateAtStart(const Object& subscription) {
     }
 }
 
+/** One object that fails is logged, and the others have their turn. */
+void Service::guard(const char* failure, const Object& object, const std::function<void()>& step) const {
+    try {
+        step();
+    } catch (const std::exception& error) {
+        say(std::string(failure) + ": " + error.what() + ": " + object.path());
+    }
+}
+
+bool Service::mayRead(const Object& subscription) const {
+    return !_options.mayRead || _options.mayRead(subscription.owner);
+}
+
 void Service::start() {
     const Changing changing(*this);
     load();
     makeFixedFilters();
-    const auto guarded = [this](const Object& object, const std::function<void()>& step) {
-        try {
-            step();
-        } catch (const std::exception& error) {
-            say("cannot be delivered: " + std::string(error.what()) + ": " + object.path());
-        }
-    };
+    const char* failure = "cannot be delivered";
     for (const ObjectPointer& each : _registry.all(Kind::destination)) {
-        guarded(*each, [&] { setDestination(*each); });
+        guard(failure, *each, [&] { setDestination(*each); });
     }
     for (const ObjectPointer& each : _registry.all(Kind::subscription)) {
-        guarded(*each, [&] {
-            setSubscription(*each);
+        guard(failure, *each, [&] {
+            if (mayRead(*each)) {
+                setSubscription(*each);
+            } // else delivery forgets what waits for it
             if (isWanted(*each)) {
                 activateAtStart(*each);
             }
@@ -164,24 +173,32 @@ void Service::stop(std::chrono::milliseconds patience) {
     _delivery->stop(patience); // without the right to change: its policy thread may want it
 }
 
+/** Owners first: a destination that changes is sent at once what waits for it. */
 void Service::review() {
     const Changing changing(*this);
     changing.requireOpen();
-    for (const ObjectPointer& each : _registry.all(Kind::destination)) {
-        try {
-            setDestination(*each);
-        } catch (const std::exception& error) {
-            say("goes on as before: " + std::string(error.what()) + ": " + each->path());
-        }
-    }
+    const char* failure = "goes on as before";
     for (const ObjectPointer& each : _registry.all(Kind::subscription)) {
-        const bool mayRead = !_options.mayRead || _options.mayRead(each->owner);
-        if (!mayRead && _activations.isActive(each->id)) {
-            static_cast<void>(_activations.stop(each->id));
-            say("subscription disabled: user '" + each->owner + "' may not read: " + each->path());
-        } else if (mayRead && isWanted(*each) && !_activations.isActive(each->id)) {
-            activateAtStart(*each);
+        guard(failure, *each, [&] { reviewOwner(*each); });
+    }
+    for (const ObjectPointer& each : _registry.all(Kind::destination)) {
+        guard(failure, *each, [&] { setDestination(*each); });
+    }
+}
+
+/** What waits goes as well: it was queued for somebody who is not to be told of anything any more. */
+void Service::reviewOwner(const Object& subscription) {
+    const bool isActive = _activations.isActive(subscription.id);
+    if (!mayRead(subscription)) {
+        if (isActive) {
+            static_cast<void>(_activations.stop(subscription.id));
+            say("subscription disabled, and what waits for it is discarded: user '" + subscription.owner +
+                "' may not read: " + subscription.path());
         }
+        _delivery->removeSubscription(subscription.key());
+    } else if (isWanted(subscription) && !isActive) {
+        setSubscription(subscription);
+        activateAtStart(subscription);
     }
 }
 

@@ -38,7 +38,8 @@ struct Options {
  * after a restart, but for transient destinations and what is subscribed for them.
  *
  * A subscription that cannot be activated at a start, since its class is gone or its owner may not read any more,
- * stays; it says that it is disabled, and is tried again at the next start and when it is enabled.
+ * stays; it says that it is disabled, and is tried again at the next start and when it is enabled. What waits for one
+ * whose owner may not read is discarded.
  */
 class Service final : public BuiltIn {
   public:
@@ -77,12 +78,14 @@ class Service final : public BuiltIn {
     [[nodiscard]] const Schema& schema() const { return _manager.schema(); }
 
     void say(const std::string& line) const;
+    void guard(const char* failure, const Object& object, const std::function<void()>& step) const;
     [[nodiscard]] Instance present(const Object& object) const;
 
     // At the start.
     void load();
     void makeFixedFilters();
     void activateAtStart(const Object& subscription);
+    [[nodiscard]] bool mayRead(const Object& subscription) const;
 
     // With the right to change.
     Status addFilter(Object&& object);
@@ -93,6 +96,7 @@ class Service final : public BuiltIn {
     Status changeDestination(const Object& former, Object&& changed);
     Status changeSubscription(const Object& former, Object&& changed);
     void replace(Object&& changed);
+    void reviewOwner(const Object& subscription);
     Status restartAll(const std::vector<ObjectPointer>& subscriptions, const Instance& filter,
                       const Instance& former);
     void removeSubscription(const Object& subscription);

@@ -171,16 +171,43 @@ TEST_F(ActivationTest, IsOfNothingThatTheOwnerCouldNotRead) {
     strangers.insert("somebody");
     service->review();
     EXPECT_EQ(stateOf(get(subscription)), 4U);
+    EXPECT_EQ(onlyKey(), "") << "what waits for it must go";
     deliver("root/test", "Test_Alert", 1, "");
     reopen();
     EXPECT_EQ(stateOf(get(subscription)), 4U);
+    EXPECT_EQ(onlyKey(), "");
     deliver("root/test", "Test_Alert", 2, "");
     EXPECT_THAT(postedNumbers(), IsEmpty());
     strangers.clear();
     service->review();
     EXPECT_EQ(stateOf(get(subscription)), 2U);
+    EXPECT_NE(onlyKey(), "");
     deliver("root/test", "Test_Alert", 3, "");
     EXPECT_THAT(postedNumbers(), ElementsAre(3));
+}
+
+TEST_F(ActivationTest, IsRefusedToWhoMayNotRead) {
+    const ObjectPath filter = makeFilter();
+    const ObjectPath destination = makeDestination();
+    strangers.insert("somebody");
+    const ActingFor acting("somebody");
+    const Status status =
+        tryToMake("CIM_IndicationSubscription", {reference("Filter", filter), reference("Handler", destination)});
+    EXPECT_EQ(status.code, CMPI_RC_ERR_ACCESS_DENIED);
+    EXPECT_THAT(status.message, HasSubstr("user 'somebody', whose subscription it is, may not read"));
+    EXPECT_THAT(names("CIM_IndicationSubscription"), IsEmpty());
+    EXPECT_EQ(onlyKey(), "");
+}
+
+TEST_F(ActivationTest, OfAnOwnerWhoMayNotReadIsForgottenByDeliveryThoughItIsDisabled) {
+    {
+        const ActingFor acting("somebody");
+        subscribe(makeFilter(), makeDestination(), {number("SubscriptionState", 4)});
+    }
+    EXPECT_NE(onlyKey(), "") << "what waits is still delivered";
+    strangers.insert("somebody");
+    service->review();
+    EXPECT_EQ(onlyKey(), "");
 }
 
 TEST_F(ActivationTest, EndsByThePolicyToDisable) {
