@@ -55,6 +55,18 @@ void ServedTest::serveSite() {
     }
 }
 
+void ServedTest::serveAccountsNamed(const std::vector<std::string>& names) {
+    serveAccounts();
+    std::string commands = "hash=$(openssl passwd -6 secret)\n"
+                           "for file in passwd shadow; do cp -p /etc/$file $file; done\n";
+    int number = 54320;
+    for (const std::string& name : names) {
+        commands += "echo " + name + ":x:" + std::to_string(++number) + ":54321::/:/bin/sh >>passwd\n" + "echo " +
+                    name + ":$hash:19000:0:99999:7::: >>shadow\n";
+    }
+    startBehind(commands + "for file in passwd shadow; do mount --bind $file /etc/$file; done");
+}
+
 void ServedTest::start() {
     writeConfiguration();
     _server = std::make_unique<Process>(_arguments, _environment, directory(), path("server.err"), _prepare);
@@ -90,6 +102,33 @@ std::string ServedTest::logWith(const std::string& text) const {
     return lines;
 }
 
+void ServedTest::readAnew(const std::string& former, const std::string& text) {
+    const auto reloads = [this] {
+        const std::string lines = log();
+        std::size_t count = 0;
+        for (std::size_t at = lines.find("event=reload"); at != lines.npos; at = lines.find("event=reload", at + 1)) {
+            ++count;
+        }
+        return count;
+    };
+    bool isFound = false;
+    for (auto& [name, table] : _tables) {
+        if (const std::size_t place = table.find(former); place != std::string::npos) {
+            table.replace(place, former.size(), text);
+            isFound = true;
+        }
+    }
+    ASSERT_TRUE(isFound) << former;
+    writeConfiguration();
+    const std::size_t before = reloads();
+    _server->signal(SIGHUP);
+    const auto end = std::chrono::steady_clock::now() + Patience;
+    while (reloads() == before && std::chrono::steady_clock::now() < end) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    ASSERT_GT(reloads(), before) << "never read anew";
+}
+
 unsigned short ServedTest::port(const std::string& scheme) const {
     const std::string address = lineOf(_said, "listening: " + scheme + " 127.0.0.1:");
     return static_cast<unsigned short>(std::stoul("0" + address));
@@ -97,6 +136,10 @@ unsigned short ServedTest::port(const std::string& scheme) const {
 
 std::string ServedTest::url(const std::string& scheme, const std::string& rest) const {
     return scheme + "://marlo:" + _password + "@127.0.0.1:" + std::to_string(port(scheme)) + "/" + rest;
+}
+
+std::string ServedTest::urlOf(const std::string& user, const std::string& password, const std::string& rest) const {
+    return "http://" + user + ":" + password + "@127.0.0.1:" + std::to_string(port("http")) + "/" + rest;
 }
 
 Outcome ServedTest::wbemcli(std::vector<std::string> arguments) const {

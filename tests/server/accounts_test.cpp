@@ -19,15 +19,8 @@ class Accounts : public Serving {
   protected:
     void SetUp() override {
         REQUIRE_NAMESPACES();
-        serveAccounts();
         configure("access", "read = [\"reader\", \"writer\"]\nchange = [\"writer\"]\n");
-        startBehind("hash=$(openssl passwd -6 secret)\n"
-                    "for file in passwd shadow; do cp -p /etc/$file $file; done\n"
-                    "for name in reader:54321 writer:54322 other:54323; do\n"
-                    "    echo \"${name%:*}:x:${name#*:}:54321::/:/bin/sh\" >>passwd\n"
-                    "    echo \"${name%:*}:$hash:19000:0:99999:7:::\" >>shadow\n"
-                    "done\n"
-                    "for file in passwd shadow; do mount --bind $file /etc/$file; done");
+        serveAccountsNamed({"reader", "writer", "other"});
         start();
     }
 
@@ -53,11 +46,7 @@ TEST_F(Accounts, GetInByTheirPasswordsAndDoWhatTheyMay) {
 
 TEST_F(Accounts, AreOthersAfterTheConfigurationWasReadAnew) {
     EXPECT_EQ(wbemcli({"ein", at("reader:secret")}).exitCode, 0);
-    std::string text = readFile(path("server.toml"));
-    text.replace(text.find("\"reader\", "), 10, "");
-    write("server.toml", text);
-    server().signal(SIGHUP);
-    static_cast<void>(logWith("read anew"));
+    readAnew("\"reader\", ", "");
     EXPECT_NE(wbemcli({"ein", at("reader:secret")}).exitCode, 0);
     EXPECT_EQ(wbemcli({"ein", at("writer:secret")}).exitCode, 0);
 }

@@ -49,6 +49,24 @@ class SubscribedServer : public ServedTest {
         std::ofstream(path("control")) << lines;
     }
 
+    std::string printed(const std::vector<std::string>& arguments) const {
+        const Outcome outcome = wbemcli(arguments);
+        EXPECT_EQ(outcome.exitCode, 0) << testing::PrintToString(arguments) << outcome.err;
+        return outcome.out;
+    }
+
+    [[nodiscard]] std::string interop(const std::string& rest) const { return url("http", "root/interop:" + rest); }
+
+    static std::string keys(const std::string& className, const std::string& name) {
+        return "SystemCreationClassName=\"CIM_ComputerSystem\",SystemName=\"here\",CreationClassName=\"" + className +
+               "\",Name=\"" + name + "\"";
+    }
+
+    /** The path of an object as a reference: wbemcli takes it without quotes of its own. */
+    static std::string reference(const std::string& host, const std::string& className, const std::string& name) {
+        return host + "/root/interop:" + className + "." + keys(className, name);
+    }
+
     void kill() {
         server().signal(SIGKILL);
         ASSERT_EQ(server().wait(Patience), 128 + SIGKILL);
