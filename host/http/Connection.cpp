@@ -112,7 +112,7 @@ void Connection::shakeHands() {
 }
 
 bool Connection::receive() {
-    auto& scratch = _loop.scratch();
+    const auto scratch = _loop.scratch();
     const Transfer transfer = _stream->read(scratch.data(), scratch.size());
     switch (transfer.progress) {
     case Progress::done:
@@ -262,7 +262,7 @@ void Connection::linger() {
 }
 
 void Connection::discard() {
-    auto& scratch = _loop.scratch();
+    const auto scratch = _loop.scratch();
     while (true) {
         const ssize_t count = ::recv(_readiness.descriptor(), scratch.data(), scratch.size(), MSG_DONTWAIT);
         if (count < 0 && (errno == EAGAIN || errno == EINTR)) {

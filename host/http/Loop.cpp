@@ -15,8 +15,6 @@ namespace asio = boost::asio;
 using asio::posix::stream_descriptor;
 using boost::system::error_code;
 
-constexpr std::size_t scratchSize = std::size_t{64} * 1024;
-
 } // namespace
 
 struct Loop::Asio {
@@ -24,7 +22,7 @@ struct Loop::Asio {
     asio::executor_work_guard<asio::io_context::executor_type> guard{context.get_executor()};
 };
 
-Loop::Loop() : _asio(std::make_unique<Asio>()), _scratch(scratchSize) {}
+Loop::Loop() : _asio(std::make_unique<Asio>()), _scratch(std::make_unique_for_overwrite<char[]>(scratchSize)) {}
 
 Loop::~Loop() = default;
 

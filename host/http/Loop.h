@@ -8,11 +8,12 @@
 
 #include <atomic>
 #include <chrono>
+#include <cstddef>
 #include <cstdint>
 #include <deque>
 #include <functional>
 #include <memory>
-#include <vector>
+#include <span>
 
 namespace marlo::http {
 
@@ -61,17 +62,19 @@ class Loop {
     std::atomic<std::uint64_t>& turn() { return _turn; }
 
     /** Room to read into, shared by all connections of the loop. */
-    std::vector<char>& scratch() { return _scratch; }
+    std::span<char> scratch() { return {_scratch.get(), scratchSize}; }
 
   private:
     friend class Readiness;
     friend class Timer;
     struct Asio;
 
+    static constexpr std::size_t scratchSize = std::size_t{64} * 1024;
+
     std::unique_ptr<Asio> _asio;
     std::deque<std::shared_ptr<Job>> _ready;
     std::atomic<std::uint64_t> _turn{0};
-    std::vector<char> _scratch;
+    std::unique_ptr<char[]> _scratch; ///< of which only what has been read into takes memory
 };
 
 /** In the hands of its loop only. */
