@@ -58,10 +58,12 @@ std::string showFacts(const server::StatusReport& report, std::size_t width, boo
     add("listens", {report.listeners, {}});
     const http::Counters& counters = report.counters;
     add("connections", {{std::to_string(counters.connections) + " open, " + std::to_string(counters.accepted) +
-                         " accepted, " + std::to_string(counters.refusedConnections) + " refused"},
+                         " accepted, " + std::to_string(counters.refusedConnections) + " refused, " +
+                         std::to_string(counters.tooSlow) + " too slow"},
                         {}});
-    add("requests",
-        {{std::to_string(counters.requests) + " received, " + std::to_string(counters.busy) + " busy"}, {}});
+    add("requests", {{std::to_string(counters.requests) + " received, " + std::to_string(counters.busy) + " busy, " +
+                      std::to_string(counters.aside) + " of them for slow clients"},
+                     {}});
     add("answers", {{showMicroseconds(report.latency.median) + " median, " + showMicroseconds(report.latency.high) +
                      " 99 of 100, " + showMicroseconds(report.latency.highest) + " longest"},
                     {}});

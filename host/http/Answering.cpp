@@ -9,16 +9,22 @@ namespace {
 
 constexpr std::string_view goOn = "HTTP/1.1 100 Continue\r\n\r\n";
 
+/** The handler is asked again after this, or when the next look at all connections is due. */
+constexpr std::chrono::milliseconds postponement{20};
+
 bool bringsBody(const std::string& method) {
     return method == "POST" || method == "M-POST" || method == "PUT" || method == "PATCH";
 }
 
 } // namespace
 
-Terms Connection::terms(bool keepsAlive) const {
+Terms Connection::terms(bool keepsAlive) {
     Terms terms;
     terms.gathered = _site.limits.gathered;
     terms.sendTime = _site.limits.sendTime;
+    terms.sendRate = _site.limits.sendRate;
+    terms.holdTime = _site.limits.holdTime;
+    terms.stepAside = [this] { return _site.workers.stepAside(*this); };
     terms.keepsAlive = keepsAlive && !_site.isStopping;
     if (_parser.hasHead()) {
         terms.version = _parser.head().version;
@@ -49,7 +55,7 @@ void Connection::run() {
     }
 }
 
-/** False when the request was refused. */
+/** False when the request was refused, or its admission put off. */
 bool Connection::admit() {
     std::optional<Answer> refusal;
     try {
@@ -63,12 +69,28 @@ bool Connection::admit() {
         conclude(reply);
         return false;
     }
+    if (refusal && refusal->isForNow && mayPostpone()) {
+        _outcome = Outcome::postponed;
+        return false;
+    }
+    if (refusal && refusal->isForNow) {
+        _site.log("request " + std::to_string(_id) + " of " + _peer.toString() + ": nobody could say in time who asks");
+    }
     if (refusal) {
         sendRefusal(std::move(*refusal));
         return false;
     }
     _isAdmitted = true;
     return true;
+}
+
+/** The request waits with its connection, and without a worker. */
+bool Connection::mayPostpone() {
+    const Clock::time_point now = Clock::now();
+    if (_lastAdmission == Clock::time_point::max()) {
+        _lastAdmission = now + _site.limits.admissionTime;
+    }
+    return now < _lastAdmission && !_site.isStopping;
 }
 
 /** What is wrong with a request that would otherwise be welcome. */
@@ -140,6 +162,7 @@ void Connection::conclude(Reply& reply) {
     _delay = reply.delay();
     _keepsAlive = reply.keepsAlive();
     _mustReset = reply.isBroken() || !reply.isComplete();
+    _site.tooSlow += reply.wasTooSlow() ? 1 : 0;
 }
 
 void Connection::done() {
@@ -155,6 +178,9 @@ void Connection::done() {
         enter(State::body, _site.limits.bodyTime);
         awaitInput();
         break;
+    case Outcome::postponed:
+        enter(State::postponed, postponement);
+        break;
     case Outcome::faulty:
         refuse(_fault->status(), _fault->what());
         break;
@@ -164,7 +190,7 @@ void Connection::done() {
         } else if (_delay.count() > 0) {
             enter(State::delayed, _delay);
         } else {
-            enter(State::sending, _site.limits.sendTime);
+            beginSending();
             _readiness.awaitWritable(shared_from_this());
         }
         break;

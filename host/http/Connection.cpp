@@ -82,6 +82,7 @@ void Connection::onReady() {
         discard();
         break;
     case State::handling:
+    case State::postponed:
     case State::delayed:
     case State::closed:
         break;
@@ -216,6 +217,7 @@ void Connection::nextRequest() {
     _body = std::string();
     _admission.reset();
     _isAdmitted = false;
+    _lastAdmission = Clock::time_point::max();
     if (_input.empty() && _input.capacity() > keptCapacity) {
         _input.shrink_to_fit();
     }
@@ -227,10 +229,26 @@ void Connection::nextRequest() {
     proceed();
 }
 
+void Connection::beginSending() {
+    enter(State::sending, never);
+    _uptake.emplace(_readiness.descriptor(), Pace(_site.limits.sendTime, _site.limits.sendRate));
+    _watched = Clock::now();
+}
+
+void Connection::watchSending(Clock::time_point now) {
+    _uptake->waited(now - std::exchange(_watched, now));
+    if (_uptake->isTooSlow()) {
+        ++_site.tooSlow;
+        _site.log("dropped " + _peer.toString() + ": it took its answer too slowly");
+        reset();
+    }
+}
+
 void Connection::sendRest() {
     while (_sent < _output.size()) {
         const Transfer transfer = _stream->write(std::string_view(_output).substr(_sent));
         _sent += transfer.bytes;
+        _uptake->wrote(transfer.bytes);
         if (transfer.progress == Progress::wantWrite) {
             _readiness.awaitWritable(shared_from_this());
             return;
@@ -243,7 +261,6 @@ void Connection::sendRest() {
             reset();
             return;
         }
-        _deadline = Clock::now() + _site.limits.sendTime;
     }
     _output = std::string();
     answered();
@@ -278,6 +295,9 @@ void Connection::discard() {
 }
 
 void Connection::tick(Clock::time_point now) {
+    if (_state == State::sending) {
+        watchSending(now);
+    }
     if (now < _deadline) {
         return;
     }
@@ -287,11 +307,11 @@ void Connection::tick(Clock::time_point now) {
         refuse(408, "the request did not come in time");
         break;
     case State::delayed:
-        enter(State::sending, _site.limits.sendTime);
+        beginSending();
         sendRest();
         break;
-    case State::sending:
-        reset();
+    case State::postponed:
+        submit();
         break;
     case State::idle:
         _stream->finish();

@@ -45,9 +45,21 @@ class Connection : public Job, public ReadinessListener, public std::enable_shar
     [[nodiscard]] Loop& loop() const override { return _loop; }
 
   private:
-    enum class State { handshake, idle, head, body, handling, delayed, sending, draining, lingering, closed };
+    enum class State {
+        handshake,
+        idle,
+        head,
+        body,
+        handling,
+        postponed,
+        delayed,
+        sending,
+        draining,
+        lingering,
+        closed
+    };
     /** What a job left to be done. */
-    enum class Outcome { answered, bodyWanted, faulty };
+    enum class Outcome { answered, bodyWanted, postponed, faulty };
 
     void enter(State state, std::chrono::milliseconds time);
     void awaitInput();
@@ -63,15 +75,18 @@ class Connection : public Job, public ReadinessListener, public std::enable_shar
 
     bool admit();
     std::optional<Answer> objection() const;
+    bool mayPostpone();
     void sendRefusal(Answer&& refusal);
     void handle();
     void answerError(Reply& reply, const std::string& reason);
     void conclude(Reply& reply);
-    [[nodiscard]] Terms terms(bool keepsAlive) const;
+    [[nodiscard]] Terms terms(bool keepsAlive);
     [[nodiscard]] bool mayDrain() const;
 
     void refuse(unsigned status, const std::string& reason);
+    void beginSending();
     void sendRest();
+    void watchSending(Clock::time_point now);
     void answered();
     void nextRequest();
     void linger();
@@ -95,12 +110,15 @@ class Connection : public Job, public ReadinessListener, public std::enable_shar
     std::string _body;
     std::any _admission;
     bool _isAdmitted = false;
+    Clock::time_point _lastAdmission = Clock::time_point::max(); ///< until then it may be put off; max: it was not
     std::uint64_t _id = 0;
 
     Outcome _outcome = Outcome::answered;
-    std::optional<Fault> _fault; ///< of a body
-    std::string _output;         ///< what the client did not take at once
-    std::size_t _sent = 0;       ///< of it, since
+    std::optional<Fault> _fault;   ///< of a body
+    std::string _output;           ///< what the client did not take at once
+    std::size_t _sent = 0;         ///< of it, since
+    std::optional<Uptake> _uptake; ///< of it
+    Clock::time_point _watched;    ///< when that was last looked at
     std::chrono::milliseconds _delay{0};
     bool _keepsAlive = true;
     bool _mustReset = false;

@@ -65,6 +65,8 @@ struct Answer {
     bool close = false; ///< the connection ends with this answer
     /** It is held back this long, by a timer and not by a worker: many who guess passwords keep nobody waiting. */
     std::chrono::milliseconds delay{0};
+    /** Of Handler::admit: the head is shown again a little later, and this is sent if that goes on for too long. */
+    bool isForNow = false;
 };
 
 } // namespace marlo::http

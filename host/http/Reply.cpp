@@ -7,6 +7,12 @@
 #include <poll.h>
 
 namespace marlo::http {
+namespace {
+
+/** Often enough to see what goes on, and seldom enough to cost nothing. */
+constexpr Pace::Time glance = std::chrono::seconds(1);
+
+} // namespace
 
 Reply::Reply(Stream& stream, int descriptor, const std::atomic<bool>& isCut, const Terms& terms)
     : _stream(stream), _descriptor(descriptor), _isCut(isCut), _terms(terms) {}
@@ -21,6 +27,11 @@ void Reply::giveUp(const char* why) {
     _isBroken = true;
     _stage = Stage::complete;
     throw ClientGone(why);
+}
+
+void Reply::drop(const char* why) {
+    _wasTooSlow = true;
+    giveUp(why);
 }
 
 void Reply::send(Answer&& answer) {
@@ -114,30 +125,43 @@ void Reply::sendPiece() {
 }
 
 void Reply::sendNow(std::string_view bytes) {
-    const auto deadline = std::chrono::steady_clock::now() + _terms.sendTime;
+    if (!_uptake) {
+        _uptake.emplace(_descriptor, Pace(_terms.sendTime, _terms.sendRate));
+    }
     while (!bytes.empty()) {
         if (_isCut) {
             giveUp("the server stops");
         }
         const Transfer transfer = _stream.write(bytes);
         bytes.remove_prefix(transfer.bytes);
+        _uptake->wrote(transfer.bytes);
         if (transfer.progress == Progress::failed || transfer.progress == Progress::ended) {
             giveUp("the client went away in the middle of an answer");
         }
-        await(transfer.progress, deadline);
+        if (transfer.progress != Progress::done) {
+            await(transfer.progress);
+        }
     }
 }
 
-void Reply::await(Progress progress, std::chrono::steady_clock::time_point deadline) {
-    if (progress == Progress::done) {
-        return;
-    }
-    const auto left = std::chrono::ceil<std::chrono::milliseconds>(deadline - std::chrono::steady_clock::now());
-    if (left.count() <= 0) {
-        giveUp("the client did not take its answer in time");
-    }
+void Reply::await(Progress progress) {
+    const auto since = std::chrono::steady_clock::now();
+    const Pace::Time toHold = _isAside ? glance : _terms.holdTime - _held;
+    const auto patience = std::chrono::ceil<std::chrono::milliseconds>(std::min({glance, _uptake->left(), toHold}));
     pollfd waited{_descriptor, static_cast<short>(progress == Progress::wantRead ? POLLIN : POLLOUT), 0};
-    ::poll(&waited, 1, static_cast<int>(left.count()));
+    ::poll(&waited, 1, static_cast<int>(patience.count()));
+    const Pace::Time time = std::chrono::steady_clock::now() - since;
+    _uptake->waited(time);
+    _held += time;
+    if (_uptake->isTooSlow()) {
+        drop("the client took its answer too slowly");
+    }
+    if (!_isAside && _held >= _terms.holdTime) {
+        _isAside = _terms.stepAside && _terms.stepAside();
+        if (!_isAside) {
+            drop("too many clients take their answers slowly");
+        }
+    }
 }
 
 /** As much as goes without waiting. */

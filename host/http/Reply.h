@@ -7,9 +7,12 @@
 #include "host/http/HeadText.h"
 #include "host/http/Server.h"
 #include "host/http/Stream.h"
+#include "host/http/Uptake.h"
 
 #include <atomic>
 #include <chrono>
+#include <functional>
+#include <optional>
 #include <string>
 
 namespace marlo::http {
@@ -22,6 +25,10 @@ struct Terms {
     bool takesTrailers = false;
     std::size_t gathered = 0;
     std::chrono::milliseconds sendTime{0};
+    std::size_t sendRate = 1;
+    std::chrono::milliseconds holdTime{0};
+    /** Asked once the client has been waited for as long as that: false when it cannot be waited for any longer. */
+    std::function<bool()> stepAside;
 };
 
 /**
@@ -46,6 +53,9 @@ class Reply : public Responder {
     /** The client would take what it has for a whole answer, or is gone: the connection is to be reset. */
     [[nodiscard]] bool isBroken() const { return _isBroken; }
 
+    /** The client could have had the answer, but took it too slowly. */
+    [[nodiscard]] bool wasTooSlow() const { return _wasTooSlow; }
+
     [[nodiscard]] bool keepsAlive() const { return _terms.keepsAlive; }
 
     [[nodiscard]] std::chrono::milliseconds delay() const { return _delay; }
@@ -60,7 +70,8 @@ class Reply : public Responder {
     void sendPiece();
     void sendNow(std::string_view bytes);
     void sendLast();
-    void await(Progress progress, std::chrono::steady_clock::time_point deadline);
+    void await(Progress progress);
+    [[noreturn]] void drop(const char* why);
     [[noreturn]] void giveUp(const char* why);
     void require(bool isInOrder) const;
 
@@ -68,6 +79,9 @@ class Reply : public Responder {
     int _descriptor;
     const std::atomic<bool>& _isCut;
     Terms _terms;
+    std::optional<Uptake> _uptake; ///< of what is written
+    Pace::Time _held{0};           ///< the time that the worker has waited
+    bool _isAside = false;
     Stage _stage = Stage::fresh;
     unsigned _status = 0;
     Fields _fields;
@@ -75,6 +89,7 @@ class Reply : public Responder {
     std::string _rest;
     std::chrono::milliseconds _delay{0};
     bool _isBroken = false;
+    bool _wasTooSlow = false;
 };
 
 } // namespace marlo::http

@@ -200,7 +200,8 @@ std::vector<Endpoint> Server::endpoints() const {
 
 Counters Server::counters() const {
     const Site& site = _state->site;
-    return {site.seats.taken(), site.accepted, site.requests, site.workers.busy(), site.refusedConnections};
+    return {site.seats.taken(),      site.accepted,        site.requests, site.workers.busy(),
+            site.refusedConnections, site.workers.aside(), site.tooSlow};
 }
 
 void Server::reloadTls(const TlsOptions& tls) {

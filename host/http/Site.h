@@ -20,7 +20,7 @@ struct Site {
           limits(limitsOfAll),
           log(std::move(logOfAll)),
           seats(limits.connections, limits.connectionsPerPeer),
-          workers(loops, limits.workers, limits.queued, log) {}
+          workers(loops, {limits.workers, limits.queued, limits.aside}, log) {}
 
     Handler& handler;
     const Limits limits;
@@ -29,6 +29,7 @@ struct Site {
     std::atomic<std::uint64_t> accepted{0};
     std::atomic<std::uint64_t> requests{0};
     std::atomic<std::uint64_t> refusedConnections{0};
+    std::atomic<std::uint64_t> tooSlow{0};
     std::atomic<bool> isStopping{false};
     Workers workers; ///< last: its threads use all of the above
 };

@@ -7,8 +7,10 @@
 #include <system_error>
 
 #include <arpa/inet.h>
+#include <linux/sockios.h>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
+#include <sys/ioctl.h>
 #include <sys/stat.h>
 #include <sys/un.h>
 
@@ -177,6 +179,11 @@ Peer peerOf(int descriptor, const sockaddr_storage& address, Transport transport
     }
     peer.address = text.data();
     return peer;
+}
+
+std::size_t untaken(int descriptor) {
+    int bytes = 0;
+    return ::ioctl(descriptor, SIOCOUTQ, &bytes) == 0 && bytes > 0 ? static_cast<std::size_t>(bytes) : 0;
 }
 
 void sendAtOnce(int descriptor) {

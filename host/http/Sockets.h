@@ -26,6 +26,12 @@ unsigned short portOf(int descriptor);
 /** Who is at the other end of a connection that came in by `transport`. */
 Peer peerOf(int descriptor, const sockaddr_storage& address, Transport transport);
 
+/**
+ * Bytes that were sent and that the other end's system has not acknowledged (SIOCOUTQ: tcp(7)); on a Unix domain
+ * socket those that have not been read, with the kernel's overhead (unix(7)). 0 where there is no telling.
+ */
+std::size_t untaken(int descriptor);
+
 /** Nothing waits for more to be sent with it: an answer that is given leaves at once. */
 void sendAtOnce(int descriptor);
 

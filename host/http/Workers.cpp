@@ -18,14 +18,13 @@ bool isInJob(std::uint64_t turn) {
 
 } // namespace
 
-Workers::Workers(std::size_t loops, std::size_t workers, std::size_t queued,
-                 std::function<void(const std::string&)> log)
-    : _workers(workers), _queueLimit(queued), _log(std::move(log)) {
+Workers::Workers(std::size_t loops, const Places& places, std::function<void(const std::string&)> log)
+    : _places(places), _log(std::move(log)) {
     for (std::size_t count = 0; count < loops; ++count) {
         _loops.push_back(std::make_unique<Loop>());
         _orphans.push_back(_loops.back().get());
     }
-    _threads.reserve(loops + workers);
+    _threads.reserve(loops + places.workers + places.aside);
     for (std::size_t count = 0; count < loops; ++count) {
         _threads.emplace_back(&Workers::work, this);
     }
@@ -58,13 +57,13 @@ void Workers::stop() {
 
 bool Workers::submit(std::shared_ptr<Job> job) {
     const std::lock_guard lock(_mutex);
-    if (_busy < _workers) {
+    if (_busy < _places.workers) {
         ++_busy;
         auto& ready = job->loop().ready();
         ready.push_back(std::move(job));
         return true;
     }
-    if (_queue.size() >= _queueLimit) {
+    if (_queue.size() >= _places.queued) {
         return false;
     }
     _queue.push_back(std::move(job));
@@ -73,7 +72,29 @@ bool Workers::submit(std::shared_ptr<Job> job) {
 
 std::size_t Workers::busy() const {
     const std::lock_guard lock(_mutex);
-    return _busy + _queue.size();
+    return _busy + _queue.size() + _aside.size();
+}
+
+std::size_t Workers::aside() const {
+    const std::lock_guard lock(_mutex);
+    return _aside.size();
+}
+
+bool Workers::stepAside(const Job& job) {
+    std::shared_ptr<Job> following;
+    {
+        const std::lock_guard lock(_mutex);
+        if (_aside.size() >= _places.aside) {
+            return false;
+        }
+        _aside.insert(&job);
+        following = passPlaceOn();
+    }
+    if (following) {
+        Loop& loop = following->loop();
+        loop.post([&loop, following = std::move(following)] { loop.ready().push_back(following); });
+    }
+    return true;
 }
 
 void Workers::work() {
@@ -113,7 +134,7 @@ bool Workers::runOwned(Loop& loop, std::shared_ptr<Job> job) {
     }
     job->run();
     const bool isMine = loop.turn().compare_exchange_strong(inJob, inJob + 1);
-    std::shared_ptr<Job> following = next();
+    std::shared_ptr<Job> following = next(*job);
     if (isMine) {
         if (following) {
             loop.ready().push_back(std::move(following));
@@ -128,14 +149,19 @@ bool Workers::runOwned(Loop& loop, std::shared_ptr<Job> job) {
     postDone(std::move(job));
     while (following) {
         following->run();
-        std::shared_ptr<Job> ended = std::exchange(following, next());
+        std::shared_ptr<Job> ended = std::move(following);
+        following = next(*ended);
         postDone(std::move(ended));
     }
     return false;
 }
 
-std::shared_ptr<Job> Workers::next() {
+std::shared_ptr<Job> Workers::next(const Job& ended) {
     const std::lock_guard lock(_mutex);
+    return _aside.erase(&ended) == 0 ? passPlaceOn() : nullptr;
+}
+
+std::shared_ptr<Job> Workers::passPlaceOn() {
     if (_queue.empty()) {
         --_busy;
         return nullptr;
@@ -188,7 +214,7 @@ bool Workers::findThread() {
     if (_parked > _orphans.size()) {
         return true;
     }
-    if (_threads.size() >= _loops.size() + _workers) {
+    if (_threads.size() >= _loops.size() + _places.workers + _places.aside) {
         return false; // one has ended its job and will be there at the next glance
     }
     try {

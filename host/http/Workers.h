@@ -14,9 +14,17 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <unordered_set>
 #include <vector>
 
 namespace marlo::http {
+
+/** How many jobs may be taken on. */
+struct Places {
+    std::size_t workers = 0; ///< that run
+    std::size_t queued = 0;  ///< that wait for a worker
+    std::size_t aside = 0;   ///< that have stepped aside
+};
 
 /**
  * Runs loops and the jobs that come out of them. A thread that owns a loop runs its jobs itself: most take less time
@@ -24,12 +32,13 @@ namespace marlo::http {
  * another thread after a millisecond or two; the one that is held up goes on without it. So no job can hold up the
  * descriptors of its loop, and quick jobs cost no change of threads.
  *
- * No more than `workers` jobs run at once; those beyond wait in one queue for all loops. Threads are started when
- * they are first needed: one for each loop, one that watches, and one for each job that took its time.
+ * No more than `workers` jobs run at once; those beyond wait in one queue for all loops. A job that waits for its
+ * client steps aside: it goes on with its thread, but another one may run in its place. Threads are started when they
+ * are first needed: one for each loop, one that watches, and one for each job that took its time.
  */
 class Workers {
   public:
-    Workers(std::size_t loops, std::size_t workers, std::size_t queued, std::function<void(const std::string&)> log);
+    Workers(std::size_t loops, const Places& places, std::function<void(const std::string&)> log);
     ~Workers();
     Workers(const Workers&) = delete;
     Workers& operator=(const Workers&) = delete;
@@ -38,8 +47,15 @@ class Workers {
 
     /** By the thread that owns the job's loop. False when too many wait already. */
     bool submit(std::shared_ptr<Job> job);
+    /**
+     * Until it ends, this job, which runs, does not count as one of those that run at once. False when too many have
+     * stepped aside already, and it counts on. By the job, once.
+     */
+    bool stepAside(const Job& job);
     /** Jobs that have been taken on and have not ended. Any thread. */
     [[nodiscard]] std::size_t busy() const;
+    /** Those of them that have stepped aside. Any thread. */
+    [[nodiscard]] std::size_t aside() const;
 
     /** Ends the loops, when no job runs or waits any more. */
     void stop();
@@ -51,7 +67,9 @@ class Workers {
     void own(Loop& loop);
     bool runOwned(Loop& loop, std::shared_ptr<Job> job);
     /** A job has ended: the next one that waits, which takes its place, or none. */
-    std::shared_ptr<Job> next();
+    std::shared_ptr<Job> next(const Job& ended);
+    /** Takes the first one out of the queue, or gives the place up. With the mutex. */
+    std::shared_ptr<Job> passPlaceOn();
     /** Calls done() of a job that ran on a thread that does not own its loop. */
     static void postDone(std::shared_ptr<Job> job);
 
@@ -61,8 +79,7 @@ class Workers {
     bool findThread();
     void startWatching();
 
-    const std::size_t _workers;
-    const std::size_t _queueLimit;
+    const Places _places;
     std::function<void(const std::string&)> _log;
     std::vector<std::unique_ptr<Loop>> _loops;
 
@@ -71,7 +88,8 @@ class Workers {
     std::condition_variable _watched;
     std::deque<std::shared_ptr<Job>> _queue;
     std::deque<Loop*> _orphans; ///< loops that nobody owns
-    std::size_t _busy = 0;
+    std::unordered_set<const Job*> _aside;
+    std::size_t _busy = 0;   ///< jobs that have a place
     std::size_t _parked = 0; ///< threads that wait for a loop
     std::vector<std::thread> _threads;
     std::thread _watcher;

@@ -24,7 +24,7 @@ void Health::complete(StatusReport& report, bool logIsFailing, std::size_t worke
     if (logIsFailing) {
         report.reasons.push_back("the log takes no lines, " + std::to_string(report.lostLogLines) + " are lost");
     }
-    if (report.counters.busy >= workers) {
+    if (report.counters.busy >= workers + report.counters.aside) {
         report.reasons.push_back("all " + std::to_string(workers) + " workers are busy");
     }
     const std::lock_guard lock(_mutex);

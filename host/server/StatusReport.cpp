@@ -76,10 +76,12 @@ std::string toJson(const StatusReport& report) {
         {"connections",
          {{"open", report.counters.connections},
           {"accepted", report.counters.accepted},
-          {"refused", report.counters.refusedConnections}}},
+          {"refused", report.counters.refusedConnections},
+          {"too_slow", report.counters.tooSlow}}},
         {"requests",
          {{"received", report.counters.requests},
           {"busy", report.counters.busy},
+          {"aside", report.counters.aside},
           {"answered", requestsJson(report.requests)}}},
         {"latency_us",
          {{"median", report.latency.median}, {"p99", report.latency.high}, {"highest", report.latency.highest}}},
@@ -106,8 +108,10 @@ StatusReport parseStatusReport(const std::string& text) {
         report.counters.connections = connections.at("open");
         report.counters.accepted = connections.at("accepted");
         report.counters.refusedConnections = connections.at("refused");
+        report.counters.tooSlow = connections.at("too_slow");
         report.counters.requests = json.at("requests").at("received");
         report.counters.busy = json.at("requests").at("busy");
+        report.counters.aside = json.at("requests").at("aside");
         for (const Json& each : json.at("requests").at("answered")) {
             report.requests.push_back({each.at("operation"), each.at("result"), each.at("count")});
         }

@@ -1,4 +1,5 @@
 #include "host/cli/Status.h"
+#include "host/server/Health.h"
 #include "host/server/Notify.h"
 #include "host/server/Signals.h"
 #include "host/server/Statistics.h"
@@ -21,6 +22,7 @@ namespace {
 using std::chrono::microseconds;
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::IsEmpty;
 using testing::Not;
 using testing::SizeIs;
 
@@ -31,7 +33,7 @@ StatusReport example() {
     report.uptimeSeconds = 3 * 86400 + 4 * 3600 + 5;
     report.configuration = "/etc/marlo/server.toml";
     report.listeners = {"http 127.0.0.1:5988", "local /run/marlo/marlo.sock"};
-    report.counters = {1, 2, 3, 4, 5};
+    report.counters = {1, 2, 3, 7, 5, 4, 6};
     report.requests = {{"GetInstance", "ok", 6}, {"GetInstance", "CIM_ERR_NOT_FOUND", 7}};
     report.latency = {1500, 2500, 10000};
     report.openEnumerations = 8;
@@ -48,6 +50,8 @@ TEST(StatusReport, ComesBackFromJson) {
     EXPECT_EQ(toJson(back), toJson(report));
     EXPECT_EQ(back.requests.at(1).count, 7U);
     EXPECT_EQ(back.counters.accepted, 2U);
+    EXPECT_EQ(back.counters.aside, 4U);
+    EXPECT_EQ(back.counters.tooSlow, 6U);
     EXPECT_EQ(back.providers.at(1).failure, "no such file");
     EXPECT_THAT(toJson(report), HasSubstr(R"("health":"degraded")"));
     EXPECT_THAT(toJson(example()), HasSubstr(R"("health":"ok")"));
@@ -70,6 +74,8 @@ TEST(StatusReport, IsShownAsTables) {
     EXPECT_THAT(text, HasSubstr("SERVER         marlo 1.2.3\nhealth         ok\n"
                                 "process        42, up 3 d 4 h\n"));
     EXPECT_THAT(text, HasSubstr("listens        http 127.0.0.1:5988\n               local /run/marlo/marlo.sock\n"));
+    EXPECT_THAT(text, HasSubstr("connections    1 open, 2 accepted, 5 refused, 6 too slow\n"
+                                "requests       3 received, 7 busy, 4 of them for slow clients\n"));
     EXPECT_THAT(text, HasSubstr("answers        1.5 ms median, 2.5 ms 99 of 100, 10.0 ms longest\n"));
     EXPECT_THAT(text, HasSubstr("memory         3.0 MiB\n"));
     EXPECT_THAT(text, HasSubstr("B         failed  libB.so  no such file\n"));
@@ -81,6 +87,21 @@ TEST(StatusReport, SaysWhyTheHealthIsDegraded) {
     report.reasons = {"first", "second"};
     EXPECT_THAT(cli::showStatus(report, 0, false),
                 HasSubstr("health         degraded\n               first\n               second\n"));
+}
+
+TEST(Health, IsDegradedWhileAllWorkersAreBusyAndNotWithSlowClients) {
+    const auto reasonsWith = [](std::uint64_t busy, std::uint64_t aside) {
+        StatusReport report;
+        report.counters.busy = busy;
+        report.counters.aside = aside;
+        Health().complete(report, false, 16);
+        return report.reasons;
+    };
+    EXPECT_THAT(reasonsWith(15, 0), IsEmpty());
+    EXPECT_THAT(reasonsWith(16, 0), ElementsAre("all 16 workers are busy"));
+    EXPECT_THAT(reasonsWith(20, 5), IsEmpty());
+    EXPECT_THAT(reasonsWith(20, 4), ElementsAre("all 16 workers are busy"));
+    EXPECT_THAT(reasonsWith(4, 5), IsEmpty()) << "they are not counted at the same moment";
 }
 
 TEST(ResidentMemory, IsThatOfThisProcess) {
