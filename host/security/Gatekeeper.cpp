@@ -7,6 +7,7 @@
 #include "host/security/Throttle.h"
 
 #include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <cstdio>
 #include <exception>
@@ -57,6 +58,23 @@ http::Answer plainAnswer(unsigned status, const char* body) {
     return answer;
 }
 
+/** One of a few who may wait for something at once. */
+class Place {
+  public:
+    Place(std::atomic<std::size_t>& taken, std::size_t most) : _taken(taken), _isGood(taken++ < most) {}
+
+    ~Place() { --_taken; }
+
+    Place(const Place&) = delete;
+    Place& operator=(const Place&) = delete;
+
+    [[nodiscard]] bool isGood() const { return _isGood; }
+
+  private:
+    std::atomic<std::size_t>& _taken;
+    const bool _isGood;
+};
+
 Identity withAllRoles(const std::string& name) {
     return {name, {Role::read, Role::change, Role::subscribe}};
 }
@@ -66,6 +84,7 @@ Identity withAllRoles(const std::string& name) {
 struct Gatekeeper::State {
     State(GatekeeperOptions& options, std::function<void(const std::string&)>&& sink)
         : accounts(std::move(options.accounts)),
+          mostWaiting(options.mostWaiting),
           trialUser(std::move(options.trialUser)),
           trial(trialUser.empty() ? Digest() : digester.of({trialUser, options.trialPassword})),
           challenge("Basic realm=" + quoted(options.realm) + ", charset=\"UTF-8\""),
@@ -80,7 +99,7 @@ struct Gatekeeper::State {
     Admission admitField(std::string_view field, const http::Peer& peer);
     Admission admitCredentials(const Credentials& credentials, const http::Peer& peer);
 
-    /** Nobody when they are not good. */
+    /** Nobody when they are not good. Waits until those who came before have asked. */
     Identity identify(const Credentials& credentials, const Digest& digest);
     Identity askAccounts(const Credentials& credentials, const Digest& digest);
     [[nodiscard]] bool isGood(const Credentials& credentials) const;
@@ -90,9 +109,11 @@ struct Gatekeeper::State {
     [[nodiscard]] Admission refuse() const;
     [[nodiscard]] Admission refuse(const http::Peer& peer, const std::string& reason) const;
     [[nodiscard]] static Admission shutOut(Clock::duration away);
+    [[nodiscard]] static Admission putOff();
     [[nodiscard]] Admission identified(Identity&& identity, const http::Peer& peer, const std::string& reason) const;
 
     const std::shared_ptr<PasswordCheck> accounts;
+    const std::size_t mostWaiting;
     const Digester digester;
     const std::string trialUser;
     const Digest trial; ///< of the trial user's credentials
@@ -101,6 +122,8 @@ struct Gatekeeper::State {
     const uid_t ownUser = geteuid();
     Throttle throttle;
     PasswordCache cache;
+    std::atomic<std::size_t> waiting{0};
+    std::mutex asking;              ///< held while the accounts are asked
     mutable std::mutex accessMutex; ///< guards the one below
     std::shared_ptr<const AccessList> access;
 };
@@ -119,6 +142,13 @@ Admission Gatekeeper::State::refuse(const http::Peer& peer, const std::string& r
 Admission Gatekeeper::State::shutOut(Clock::duration away) {
     http::Answer answer = plainAnswer(429, "Too Many Requests\n");
     answer.fields.push_back({"Retry-After", std::to_string(std::chrono::ceil<std::chrono::seconds>(away).count())});
+    return {Identity(), std::move(answer)};
+}
+
+Admission Gatekeeper::State::putOff() {
+    http::Answer answer = plainAnswer(503, "Service Unavailable\n");
+    answer.fields.push_back({"Retry-After", "1"});
+    answer.isForNow = true;
     return {Identity(), std::move(answer)};
 }
 
@@ -182,6 +212,8 @@ Identity Gatekeeper::State::identify(const Credentials& credentials, const Diges
     if (!accounts) {
         return {};
     }
+    const std::lock_guard<std::mutex> lock(asking);
+    // Clients with many connections come with all at once: the answer to the first one is good for the others.
     if (std::optional<Identity> known = cache.find(credentials.user, digest, Clock::now())) {
         return *std::move(known);
     }
@@ -197,6 +229,13 @@ Admission Gatekeeper::State::admitCredentials(const Credentials& credentials, co
     const std::string key = peerKey(peer.address);
     if (const Clock::duration away = throttle.shutOut(key, since); away.count() > 0) {
         return shutOut(away);
+    }
+    if (std::optional<Identity> known = cache.find(credentials.user, digest, since)) {
+        return {*std::move(known), std::nullopt};
+    }
+    const Place place(waiting, mostWaiting);
+    if (!place.isGood()) {
+        return putOff();
     }
     Identity identity = identify(credentials, digest);
     if (!identity.isNobody()) {

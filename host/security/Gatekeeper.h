@@ -8,6 +8,7 @@
 #include "host/security/Identity.h"
 
 #include <chrono>
+#include <cstddef>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -47,6 +48,7 @@ std::unique_ptr<PasswordCheck> makePamCheck(const std::string& service, const st
 struct GatekeeperOptions {
     Access access;
     std::shared_ptr<PasswordCheck> accounts; ///< none: no system accounts
+    std::size_t mostWaiting = 4;             ///< requests that wait for the accounts at once, each with a worker
     std::string trialUser;                   ///< with the password below it may do everything; empty: there is none
     std::string trialPassword;
     std::string realm = "marlo";
@@ -55,8 +57,9 @@ struct GatekeeperOptions {
 
 /** What came of looking at a request. */
 struct Admission {
-    Identity identity;                   ///< nobody where `refusal` is set
-    std::optional<http::Answer> refusal; ///< 401 with WWW-Authenticate; 429 with Retry-After after too many failures
+    Identity identity; ///< nobody where `refusal` is set
+    /** 401 with WWW-Authenticate; 429 with Retry-After after too many failures; 503 with it, for now, see below. */
+    std::optional<http::Answer> refusal;
 };
 
 /**
@@ -68,7 +71,11 @@ struct Admission {
  * The answers to wrong credentials are held back (http::Answer::delay), those of one peer one after the other: the
  * first by `failureDelay`, the next ones by up to eight times as much, forgiven one a minute. A peer whose answers
  * pile up is answered 429 without a look at what it brings, unless it is the trial password. What was good at an
- * account is remembered for half a minute. Any thread; waits for nothing but the accounts.
+ * account is remembered for half a minute.
+ *
+ * Accounts are asked one question at a time, and may take theirs. While as many wait for them as may, others are
+ * answered 503 for now (http::Answer::isForNow): whoever does not need the accounts gets in meanwhile. That goes for
+ * names without a role as well, or it would tell who has one. Any thread; waits for nothing but the accounts.
  */
 class Gatekeeper {
   public:

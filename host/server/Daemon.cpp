@@ -163,6 +163,7 @@ security::GatekeeperOptions Daemon::State::gatekeeperOptions() {
     } else if (::geteuid() == 0) {
         gate.access = configuration.access;
         gate.accounts = security::makePamCheck(configuration.pamService);
+        gate.mostWaiting = std::max<std::size_t>(configuration.limits.workers / 4, 1);
     } else {
         announcement.notes.emplace_back(
             "this is not root, which alone may check passwords: only the user that serves "
@@ -175,7 +176,7 @@ wbem::ServiceOptions Daemon::State::serviceOptions() {
     wbem::ServiceOptions wbem;
     wbem.admit = [this](const http::RequestHead& head, const http::Peer& peer) {
         security::Admission admission = gatekeeper->admit(head, peer);
-        if (admission.refusal) {
+        if (admission.refusal && !admission.refusal->isForNow) {
             statistics.count("admission", "HTTP " + std::to_string(admission.refusal->status));
         }
         return admission;
