@@ -299,6 +299,7 @@ Daemon::Daemon(DaemonOptions options) : _state(std::make_unique<State>(std::move
     }
     state.log.write(LogLevel::info, "start", "marlo " + state.options.version);
     notifyManager("READY=1");
+    ::malloc_trim(0); // a server may idle for days with what only its start needed
 }
 
 Daemon::~Daemon() = default;
