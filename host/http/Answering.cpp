@@ -24,6 +24,7 @@ Terms Connection::terms(bool keepsAlive) {
     terms.sendTime = _site.limits.sendTime;
     terms.sendRate = _site.limits.sendRate;
     terms.holdTime = _site.limits.holdTime;
+    terms.longestHold = _site.limits.longestHold;
     terms.stepAside = [this] { return _site.workers.stepAside(*this); };
     terms.keepsAlive = keepsAlive && !_site.isStopping;
     if (_parser.hasHead()) {
@@ -74,7 +75,8 @@ bool Connection::admit() {
         return false;
     }
     if (refusal && refusal->isForNow) {
-        _site.log("request " + std::to_string(_id) + " of " + _peer.toString() + ": nobody could say in time who asks");
+        _site.log("request " + std::to_string(_id) + " of " + _peer.toString() +
+                  ": nobody could say in time who asks");
     }
     if (refusal) {
         sendRefusal(std::move(*refusal));

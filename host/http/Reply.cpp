@@ -146,21 +146,28 @@ void Reply::sendNow(std::string_view bytes) {
 
 void Reply::await(Progress progress) {
     const auto since = std::chrono::steady_clock::now();
-    const Pace::Time toHold = _isAside ? glance : _terms.holdTime - _held;
+    const Pace::Time most = _held < _terms.holdTime ? _terms.holdTime : _terms.longestHold;
+    const Pace::Time toHold = _isAside ? glance : most - _held;
     const auto patience = std::chrono::ceil<std::chrono::milliseconds>(std::min({glance, _uptake->left(), toHold}));
     pollfd waited{_descriptor, static_cast<short>(progress == Progress::wantRead ? POLLIN : POLLOUT), 0};
     ::poll(&waited, 1, static_cast<int>(patience.count()));
     const Pace::Time time = std::chrono::steady_clock::now() - since;
     _uptake->waited(time);
-    _held += time;
     if (_uptake->isTooSlow()) {
         drop("the client took its answer too slowly");
     }
-    if (!_isAside && _held >= _terms.holdTime) {
-        _isAside = _terms.stepAside && _terms.stepAside();
-        if (!_isAside) {
-            drop("too many clients take their answers slowly");
-        }
+    hold(time);
+}
+
+/** The worker has waited for so long. */
+void Reply::hold(Pace::Time time) {
+    _held += time;
+    if (_isAside || _held < _terms.holdTime) {
+        return;
+    }
+    _isAside = _terms.stepAside && _terms.stepAside();
+    if (!_isAside && _held >= _terms.longestHold) {
+        drop("too many clients take their answers slowly");
     }
 }
 

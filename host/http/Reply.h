@@ -27,7 +27,8 @@ struct Terms {
     std::chrono::milliseconds sendTime{0};
     std::size_t sendRate = 1;
     std::chrono::milliseconds holdTime{0};
-    /** Asked once the client has been waited for as long as that: false when it cannot be waited for any longer. */
+    std::chrono::milliseconds longestHold{0};
+    /** Asked when the client has been waited for as long as holdTime; false: it may be for longestHold. */
     std::function<bool()> stepAside;
 };
 
@@ -71,6 +72,7 @@ class Reply : public Responder {
     void sendNow(std::string_view bytes);
     void sendLast();
     void await(Progress progress);
+    void hold(Pace::Time time);
     [[noreturn]] void drop(const char* why);
     [[noreturn]] void giveUp(const char* why);
     void require(bool isInOrder) const;

@@ -85,14 +85,15 @@ struct Limits {
     std::size_t connectionsPerPeer = 256;                 ///< of one address, or one user of the local socket
     std::size_t workers = 16;                             ///< requests that are handled at once
     std::size_t queued = 256;                             ///< requests that wait for a worker; 503 beyond
-    std::size_t aside = 64;                               ///< answers to clients that keep a worker waiting
+    std::size_t aside = 16;                               ///< answers to clients that keep a worker waiting
     std::size_t sendRate = std::size_t{8} * 1024;         ///< bytes a second that a client takes of an answer
     std::size_t drained = std::size_t{64} * 1024;   ///< of the body of a refused request; its connection is kept
     std::chrono::milliseconds headTime{10000};      ///< from the first byte to the end of the head
     std::chrono::milliseconds bodyTime{30000};      ///< of the whole body
     std::chrono::milliseconds idleTime{60000};      ///< between two requests
     std::chrono::milliseconds sendTime{30000};      ///< that a client may fall behind the rate above
-    std::chrono::milliseconds holdTime{500};        ///< that it may keep a worker waiting, in all, for one answer
+    std::chrono::milliseconds holdTime{500};        ///< that it keeps a worker waiting before that steps aside
+    std::chrono::milliseconds longestHold{10000};   ///< that it keeps a worker waiting where none may step aside
     std::chrono::milliseconds admissionTime{10000}; ///< for the handler to make up its mind: Answer::isForNow
     std::chrono::milliseconds lingerTime{5000};     ///< for a client that still sends to see the last answer
 

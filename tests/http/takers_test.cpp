@@ -85,9 +85,25 @@ TEST_F(Takers, GetAllOfTheirAnswersAndGiveTheirPlacesBack) {
     EXPECT_EQ(server().counters().tooSlow, 0U);
 }
 
-TEST_F(Takers, BeyondTheLimitAreDropped) {
+TEST_F(Takers, BeyondTheLimitHoldAWorkerUntilThereIsAPlace) {
+    limits.workers = 2;
+    limits.aside = 1;
+    limits.longestHold = milliseconds(60000);
+    RawClient first = slowTaker();
+    ASSERT_TRUE(comeAside(1));
+    RawClient second = slowTaker();
+    RawClient other = clientOf(0);
+    EXPECT_EQ(answerSize(other, "/"), pieceSize);
+    EXPECT_TRUE(first.readAnswer().isWhole);
+    ASSERT_TRUE(comesTrue([this] { return server().counters().busy == 1 && server().counters().aside == 1; }));
+    EXPECT_TRUE(second.readAnswer().isWhole);
+    EXPECT_EQ(server().counters().tooSlow, 0U);
+}
+
+TEST_F(Takers, BeyondTheLimitAreDroppedWhenTheyHoldAWorkerForTooLong) {
     limits.workers = 1;
     limits.aside = 2;
+    limits.longestHold = milliseconds(100);
     const auto reason = std::make_shared<std::string>();
     handler.onHandle = [reason, write = handler.onHandle](Request&& request, Responder& responder) {
         try {
