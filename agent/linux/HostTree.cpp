@@ -46,7 +46,12 @@ auto ask(const Question& question) -> decltype(question()) {
 std::shared_ptr<const Tree> HostTree::update(const KernelState& state, const HostConfiguration& configuration,
                                              const std::set<int>& changed) {
     rebuild(state, configuration, changed);
-    return assemble(configuration.hostName());
+    const std::string& hostName = configuration.hostName();
+    _tree = _isReshaped || hostName != _hostName ? assemble(hostName) : exchange();
+    _hostName = hostName;
+    _isReshaped = false;
+    _rebuilt.clear();
+    return _tree;
 }
 
 void HostTree::rebuild(const KernelState& state, const HostConfiguration& configuration,
@@ -54,8 +59,9 @@ void HostTree::rebuild(const KernelState& state, const HostConfiguration& config
     for (const int index : changed) {
         const auto link = state.links().find(index);
         if (link == state.links().end() || isLoopback(link->second)) {
-            _interfaces.erase(index);
+            _isReshaped = _interfaces.erase(index) != 0 || _isReshaped;
         } else {
+            _rebuilt.insert(index);
             updateInterface(link->second, state, configuration);
         }
     }
@@ -120,6 +126,7 @@ void HostTree::identify(const Link& link, Interface& interface) {
     if (same) {
         return;
     }
+    _isReshaped = true;
     interface.device = deviceOf(link);
     interface.permanentAddress = link.permanentAddress;
     if (interface.device.isReal && link.permanentAddress.empty()) {
@@ -207,6 +214,19 @@ std::shared_ptr<const Tree> HostTree::assemble(const std::string& hostName) {
         }
     }
     return std::make_shared<const Tree>(std::move(nodes));
+}
+
+/** The last tree with the nodes that have been built since: most changes leave everything in its place. */
+std::shared_ptr<const Tree> HostTree::exchange() const {
+    std::vector<NodePointer> nodes;
+    for (const int index : _rebuilt) {
+        const Interface& interface = _interfaces.at(index);
+        nodes.push_back(interface.adapter);
+        if (interface.port) {
+            nodes.push_back(interface.port);
+        }
+    }
+    return std::make_shared<const Tree>(*_tree, nodes);
 }
 
 } // namespace Orv::Agent::Linux

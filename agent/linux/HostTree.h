@@ -83,11 +83,16 @@ class HostTree {
                                             const std::string& description) const;
     [[nodiscard]] std::vector<NodePointer> above(const Device& device, const std::string& hostName) const;
     std::shared_ptr<const Tree> assemble(const std::string& hostName);
+    [[nodiscard]] std::shared_ptr<const Tree> exchange() const;
     std::vector<NodePointer> structure(const std::string& hostName);
 
     HardwareSource _hardware;
     std::map<int, Interface> _interfaces;
     std::map<std::string, NodePointer> _structure; ///< host, chassis and device nodes by path
+    std::shared_ptr<const Tree> _tree;             ///< the last one; null in the beginning
+    std::string _hostName;                         ///< as it is in that
+    std::set<int> _rebuilt;                        ///< interfaces whose nodes may have become others since
+    bool _isReshaped = true;                       ///< since then interfaces have come, gone or become others
 };
 
 } // namespace Orv::Agent::Linux

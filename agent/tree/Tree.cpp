@@ -16,17 +16,35 @@ std::uint32_t hashOf(std::string_view path) {
 
 Tree::Tree(std::vector<NodePointer> nodes) : _slots(std::bit_ceil(2 * nodes.size() + 1)) {
     _nodes.reserve(nodes.size());
+    _placesInType.reserve(nodes.size());
     for (NodePointer& node : nodes) {
         const std::uint32_t hash = hashOf(node->path);
         Slot& slot = _slots[slotOf(node->path, hash)];
         if (slot.place != 0) {
             continue;
         }
+        std::size_t placeInType = 0;
         if (node->type) {
-            _byType[*node->type].push_back(node);
+            std::vector<NodePointer>& ofType = _byType[*node->type];
+            placeInType = ofType.size();
+            ofType.push_back(node);
         }
+        _placesInType.push_back(static_cast<std::uint32_t>(placeInType));
         _nodes.push_back(std::move(node));
         slot = {hash, static_cast<std::uint32_t>(_nodes.size())};
+    }
+}
+
+Tree::Tree(const Tree& former, const std::vector<NodePointer>& fresh) : Tree(former) {
+    for (const NodePointer& node : fresh) {
+        const std::size_t place = placeOf(node->path);
+        if (place == 0) {
+            continue;
+        }
+        if (node->type) {
+            _byType[*node->type].at(_placesInType[place - 1]) = node;
+        }
+        _nodes[place - 1] = node;
     }
 }
 
@@ -46,13 +64,15 @@ std::size_t Tree::slotOf(std::string_view path, std::uint32_t hash) const {
     return at;
 }
 
+/** The place of the node at a path in _nodes, from 1; 0 when there is none. */
+std::size_t Tree::placeOf(std::string_view path) const {
+    return _slots.empty() ? 0 : _slots[slotOf(path, hashOf(path))].place;
+}
+
 const Tree::NodePointer& Tree::find(std::string_view path) const {
     static const NodePointer none;
-    if (_slots.empty()) {
-        return none;
-    }
-    const Slot& slot = _slots[slotOf(path, hashOf(path))];
-    return slot.place == 0 ? none : _nodes[slot.place - 1];
+    const std::size_t place = placeOf(path);
+    return place == 0 ? none : _nodes[place - 1];
 }
 
 } // namespace Orv::Agent

@@ -43,6 +43,12 @@ class Tree {
      */
     explicit Tree(std::vector<NodePointer> nodes);
 
+    /**
+     * `former` with these nodes in the place of those that have their paths there, which are of the same types; a
+     * node whose path is not there is left out. Much cheaper than to put the whole tree together once more.
+     */
+    Tree(const Tree& former, const std::vector<NodePointer>& fresh);
+
     /** The nodes of a type in iteration order. */
     [[nodiscard]] const std::vector<NodePointer>& nodesOfType(NodeLexicon::NodeType type) const;
 
@@ -60,8 +66,10 @@ class Tree {
     };
 
     [[nodiscard]] std::size_t slotOf(std::string_view path, std::uint32_t hash) const;
+    [[nodiscard]] std::size_t placeOf(std::string_view path) const;
 
     std::vector<NodePointer> _nodes;
+    std::vector<std::uint32_t> _placesInType; ///< of each node the place among those of its type, from 0
     std::map<NodeLexicon::NodeType, std::vector<NodePointer>> _byType;
     /** A power of two of them, at most half of them taken. One block and no pointers, so that a tree of ten thousand
      *  nodes is put together and searched without a trip to memory per node. */

@@ -111,6 +111,22 @@ TEST(Tree, SharesItsNodesWithWhoeverGaveThem) {
     EXPECT_EQ(before.find("a"), after.find("a"));
 }
 
+TEST(Tree, ExchangesNodesAndSharesTheOthers) {
+    const Tree former = sample();
+    const auto fresh = makeNode("a", "host", NODE_NETWORK_ADAPTER, "fresh");
+    const auto host = makeNode("host", "", {}, "renamed");
+    const Tree tree(former, {fresh, host, makeNode("stranger", "host", NODE_NETWORK_PORT)});
+    EXPECT_EQ(tree.nodesOfType(NODE_NETWORK_ADAPTER).at(1), fresh);
+    EXPECT_EQ(tree.nodes().at(3), fresh);
+    EXPECT_EQ(tree.find("a"), fresh);
+    EXPECT_EQ(tree.find("host"), host);
+    EXPECT_EQ(tree.find("b"), former.find("b"));
+    EXPECT_THAT(pathsOf(tree.nodes()), ElementsAre("host", "b", "p", "a"));
+    EXPECT_THAT(pathsOf(tree.nodesOfType(NODE_NETWORK_PORT)), ElementsAre("p"));
+    EXPECT_NE(former.find("a"), fresh) << "the former stays as it was";
+    EXPECT_EQ(Tree(Tree(), {fresh}).find("a"), nullptr);
+}
+
 TEST(Tree, FindsEveryNodeAfterBeingMoved) {
     Tree tree = sample();
     const Tree moved = std::move(tree);

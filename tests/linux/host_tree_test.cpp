@@ -167,6 +167,33 @@ TEST_F(HostTreeTest, sharesNodesThatAReadingFindsUnchanged) {
     EXPECT_EQ(after->nodes(), before->nodes()) << "the pointers, not only what they point at";
 }
 
+TEST_F(HostTreeTest, showsWhatHasChangedAmongNodesThatStay) {
+    devices["pci1"] = {"/sys/devices/pci1", "pci", "Vendor", "Model", {}, {}, false};
+    Link card = onBus(2, "eth0", "pci1");
+    const auto before = read({card, link(3, "odd0"), link(4, "odd1")});
+    card.flags = 0;
+    card.address.back() = 0xCC;
+    // What is built between two trees belongs to the next as well.
+    state.apply(Change<Link>{card, false});
+    tree.rebuild(state, configuration, state.takeChanges());
+    const auto after = read({link(4, "odd1", 0)});
+    EXPECT_EQ(textOf(*after, "eth0", PROP_MAC_ADDRESS), "02:00:00:00:00:cc");
+    EXPECT_EQ(valueOf<std::string>(*adapterOf(*after, "eth0", NODE_NETWORK_PORT), PROP_MAC_ADDRESS),
+              "02:00:00:00:00:cc");
+    EXPECT_NE(adapterOf(*after, "odd1"), adapterOf(*before, "odd1"));
+    EXPECT_EQ(adapterOf(*after, "odd0"), adapterOf(*before, "odd0"));
+    EXPECT_EQ(textOf(*before, "eth0", PROP_MAC_ADDRESS), "02:00:00:00:00:02") << "trees do not change";
+}
+
+TEST_F(HostTreeTest, showsAnInterfaceThatHasMovedToAnotherDeviceThere) {
+    devices["pci1"] = {"/sys/devices/pci1", "pci", "Vendor", "One", {}, {}, false};
+    devices["pci2"] = {"/sys/devices/pci2", "pci", "Vendor", "Two", {}, {}, false};
+    read({onBus(2, "eth0", "pci1"), link(3, "odd0")});
+    const auto made = read({onBus(2, "eth0", "pci2")});
+    EXPECT_EQ(parentDescription(*made, *adapterOf(*made, "eth0")), "Vendor Two");
+    EXPECT_EQ(made->nodesOfType(NODE_NETWORK_ADAPTER).size(), 2U);
+}
+
 TEST_F(HostTreeTest, dropsADeviceWithItsLastInterface) {
     devices["pci1"] = {"/sys/devices/pci1", "pci", "Vendor", "Model", {}, {}, false};
     const auto before = read({onBus(2, "eth0", "pci1"), link(3, "odd0")});
