@@ -111,7 +111,9 @@ void KernelState::applyAddress(const Change<Address>& change) {
             return;
         }
         addresses.erase(known);
-        _staleRoutes.at(familySlot(address.local.family)) = true;
+        if (mayHaveTakenRoutes(address)) {
+            _staleRoutes.at(familySlot(address.local.family)) = true;
+        }
     } else if (known == addresses.end()) {
         insert(addresses, address);
     } else if (*known == address) {
@@ -124,6 +126,18 @@ void KernelState::applyAddress(const Change<Address>& change) {
         *known = address;
     }
     _changed.insert(address.index);
+}
+
+/**
+ * Whether default routes may have gone with an address, by what the kernel does without a word: it clears an
+ * interface of IPv4 with the last address (fib_disable_ip) and drops the routes of a source that is gone
+ * (fib_sync_down_addr). For IPv6 that is not relied on.
+ */
+bool KernelState::mayHaveTakenRoutes(const Address& gone) const {
+    const Addresses& left = addressesOf(gone.index);
+    const bool others = std::any_of(
+        left.begin(), left.end(), [&](const Address& address) { return address.local.family == gone.local.family; });
+    return !others || gone.local.family != AF_INET || _routeSources.count(gone.local) != 0;
 }
 
 void KernelState::applyRoute(const Change<Route>& change) {
@@ -143,9 +157,15 @@ void KernelState::setRoutes(std::uint8_t family, const std::vector<Route>& route
         std::copy_if(known.begin(), known.end(), std::back_inserter(fresh[index]),
                      [&](const DefaultRoute& route) { return route.family != family; });
     }
+    if (family == AF_INET) {
+        _routeSources.clear();
+    }
     for (const Route& route : routes) {
         if (!leadsOut(route) || route.family != family) {
             continue;
+        }
+        if (family == AF_INET && route.source.any()) {
+            _routeSources.insert(route.source);
         }
         for (const NextHop& hop : route.hops) {
             fresh[hop.index].push_back({family, route.preference, hop.flags, route.metric, hop.gateway});

@@ -47,8 +47,10 @@ using GatewayKey = std::pair<int, IpAddress>;
  * The tables. One thread at a time.
  *
  * Links and addresses follow the kernel's notifications exactly, their order within an interface included. Default
- * routes do not: the kernel withdraws IPv4 routes without a word when an interface goes down or an address leaves. So
- * whatever may have touched them marks the routes of that family as stale, and they are read again.
+ * routes do not: the kernel withdraws IPv4 routes without a word when an interface goes down or loses its last
+ * address, and when the address leaves that they have as their source. So whatever may have touched them marks the
+ * routes of that family as stale, and they are read again, which takes the longer the more routes there are of any
+ * kind.
  */
 class KernelState {
   public:
@@ -108,6 +110,7 @@ class KernelState {
     void applyNeighbour(const Change<Neighbour>& change);
     void applyTeam(const TeamOptions& options);
     void removeLink(int index);
+    [[nodiscard]] bool mayHaveTakenRoutes(const Address& gone) const;
     void findContested();
 
     void markRoutesStale() { _staleRoutes = {true, true}; }
@@ -124,6 +127,7 @@ class KernelState {
     std::map<int, Team> _teams; ///< an entry for every link of that kind
     std::map<int, Addresses> _addresses;
     std::map<int, DefaultRoutes> _routes;
+    std::set<IpAddress> _routeSources; ///< the own addresses that IPv4 default routes prefer
     std::set<GatewayKey> _contested;
     std::set<GatewayKey> _unreachable;
     std::array<bool, 2> _staleRoutes{true, true}; ///< IPv4, IPv6

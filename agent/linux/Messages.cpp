@@ -243,6 +243,9 @@ void readRouteAttribute(const nlattr& attribute, Route& route) {
     case RTA_PRIORITY:
         route.metric = numberOf<std::uint32_t>(attribute).value_or(0);
         break;
+    case RTA_PREFSRC:
+        route.source = IpAddress::fromBytes(route.family, bytesOf(attribute));
+        break;
     case RTA_PREF:
         route.preference = numberOf<std::uint8_t>(attribute).value_or(0);
         break;

@@ -66,6 +66,7 @@ struct Route {
     std::uint32_t table = 0;     ///< RT_TABLE_*
     std::uint32_t metric = 0;
     std::vector<NextHop> hops;
+    IpAddress source{}; ///< the own address that it prefers; of family 0 when it prefers none
 
     bool operator==(const Route&) const = default;
 };

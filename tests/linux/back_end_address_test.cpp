@@ -121,6 +121,25 @@ TEST_F(LinuxBackEndAddressTest, losesTheGatewayThatTheKernelWithdrawsSilently) {
     expectAgreement();
 }
 
+TEST_F(LinuxBackEndAddressTest, knowsWhichGatewaysGoWithAnAddressAmongOthers) {
+    addPair();
+    for (const char* address : {"192.0.2.10/24", "192.0.2.11/24", "198.51.100.10/24"}) {
+        space->ip(std::string("addr add ") + address + " dev left");
+    }
+    space->ip("addr add 203.0.113.10/24 dev right");
+    space->ip("route add default via 192.0.2.1 dev left");
+    space->ip("route add default via 203.0.113.1 dev right metric 9 src 198.51.100.10");
+    EXPECT_EQ(textOf(*tree(), "right", PROP_DEFAULT_GATEWAY), "203.0.113.1");
+    space->ip("addr del 192.0.2.11/24 dev left");
+    expectAgreement();
+    space->ip("addr del 198.51.100.10/24 dev left");
+    EXPECT_EQ(textOf(*tree(), "right", PROP_DEFAULT_GATEWAY), "");
+    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "192.0.2.1");
+    space->ip("addr del 192.0.2.10/24 dev left");
+    EXPECT_EQ(textOf(*tree(), "left", PROP_DEFAULT_GATEWAY), "");
+    expectAgreement();
+}
+
 TEST_F(LinuxBackEndAddressTest, passesOverAGatewayThatCannotBeReached) {
     addPair();
     space->ip("addr add 192.0.2.10/24 dev left");

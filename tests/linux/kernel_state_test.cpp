@@ -193,6 +193,24 @@ TEST(KernelState, readsRoutesAgainAfterWhateverTakesThemAwaySilently) {
     }
 }
 
+TEST(KernelState, leavesRoutesAloneWhenAnAddressGoesThatTakesNoneWithIt) {
+    KernelState state = quietState({link(2, "eth0"), link(3, "eth1")});
+    for (const char* text : {"10.0.0.1/24", "10.0.0.2/32", "10.0.0.3/24"}) {
+        comes(state, address(2, text));
+    }
+    Route sourced = route(3, "10.0.1.254", 0);
+    sourced.source = ipAddress("10.0.0.2");
+    state.setRoutes(AF_INET, {route(2, "10.0.0.254", 0), sourced});
+    goes(state, address(2, "10.0.0.1/24"));
+    EXPECT_FALSE(state.routesStale(AF_INET)) << "others stay, and no route has it as its source";
+    goes(state, address(2, "10.0.0.2/32"));
+    EXPECT_TRUE(state.routesStale(AF_INET)) << "another interface's route has it as its source";
+    state.setRoutes(AF_INET, {route(2, "10.0.0.254", 0)});
+    comes(state, address(2, "fd00::1/64"));
+    goes(state, address(2, "10.0.0.3/24"));
+    EXPECT_TRUE(state.routesStale(AF_INET)) << "the last of its family";
+}
+
 TEST(KernelState, leavesRoutesAloneWhenOnlyAnotherTableChanges) {
     KernelState state = quietState({link(2, "eth0")});
     Route other = route(2, "10.0.0.254", 0);

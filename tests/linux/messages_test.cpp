@@ -193,6 +193,12 @@ TEST(RouteMessage, givesTheOneWayOut) {
     EXPECT_EQ(route, (Route{AF_INET, RTN_UNICAST, 0, RT_TABLE_MAIN, 100, {{4, 0, ipv4(10, 0, 0, 254)}}}));
 }
 
+TEST(RouteMessage, givesTheSourceThatIsPreferred) {
+    const Attributes attributes = Attributes().add(RTA_OIF, std::uint32_t{4}).add(RTA_PREFSRC, Octets{10, 0, 0, 1});
+    EXPECT_EQ(objectOf<Route>(MessageBytes(RTM_NEWROUTE, routeHeader(), attributes).parse()).source,
+              ipv4(10, 0, 0, 1));
+}
+
 TEST(RouteMessage, takesTheWholeNumberOfTheTable) {
     const Attributes attributes = Attributes().add(RTA_TABLE, std::uint32_t{1000}).add(RTA_OIF, std::uint32_t{4});
     EXPECT_EQ(objectOf<Route>(MessageBytes(RTM_NEWROUTE, routeHeader(), attributes).parse()).table, 1000U);
