@@ -236,6 +236,8 @@ TEST_F(LibraryMonitoringTest, MayBeStoppedAndStartedFromWithinTheCallback) {
     EXPECT_EQ(receiver.paths.await(2).size(), 2U);
     receiver.stop();
     EXPECT_EQ(calls, 2);
+    receiver.start(); // which joins the thread that could not join itself
+    receiver.stop();
 }
 
 TEST_F(LibraryMonitoringTest, StopsWhenNoCallbackRunsAlsoForAHolderOfACursor) {
