@@ -35,7 +35,7 @@ Tree::Tree(std::vector<NodePointer> nodes) : _slots(std::bit_ceil(2 * nodes.size
     }
 }
 
-Tree::Tree(const Tree& former, const std::vector<NodePointer>& fresh) : Tree(former) {
+Tree::Tree(Tree former, const std::vector<NodePointer>& fresh) : Tree(std::move(former)) {
     for (const NodePointer& node : fresh) {
         const std::size_t place = placeOf(node->path);
         if (place == 0) {

@@ -47,7 +47,7 @@ class Tree {
      * `former` with these nodes in the place of those that have their paths there, which are of the same types; a
      * node whose path is not there is left out. Much cheaper than to put the whole tree together once more.
      */
-    Tree(const Tree& former, const std::vector<NodePointer>& fresh);
+    Tree(Tree former, const std::vector<NodePointer>& fresh);
 
     /** The nodes of a type in iteration order. */
     [[nodiscard]] const std::vector<NodePointer>& nodesOfType(NodeLexicon::NodeType type) const;

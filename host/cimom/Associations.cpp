@@ -45,12 +45,18 @@ void requireRole(const std::vector<const Class*>& associations, const std::strin
     }
 }
 
+void requireKnownClass(const Schema& schema, const std::string& nameSpace, const std::string& name) {
+    if (schema.findClass(nameSpace, name) == nullptr) {
+        refuse("there is no class '" + name + "' in " + nameSpace);
+    }
+}
+
 /** The same once more, after the filter has been compared with the schema. */
 std::vector<const Class*> requireAssociations(const Schema& schema, const std::string& nameSpace,
                                               const AssociationFilter& filter) {
     for (const std::string& name : {filter.associationClass, filter.resultClass}) {
-        if (!name.empty() && schema.findClass(nameSpace, name) == nullptr) {
-            refuse("there is no class '" + name + "' in " + nameSpace);
+        if (!name.empty()) {
+            requireKnownClass(schema, nameSpace, name);
         }
     }
     if (!filter.associationClass.empty() && !schema.findClass(nameSpace, filter.associationClass)->isAssociation) {

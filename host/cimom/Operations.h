@@ -29,17 +29,17 @@ class Operations {
     /** The core outlives this. */
     explicit Operations(Core& core) : _core(core) {}
 
-    Status enumerate(const std::string& nameSpace, const std::string& className, const PropertyList& properties,
+    Status enumerate(const std::string& givenNameSpace, const std::string& className, const PropertyList& properties,
                      const InstanceSink& sink);
-    Status enumerateNames(const std::string& nameSpace, const std::string& className, const PathSink& sink);
-    Status get(const ObjectPath& path, const PropertyList& properties, const InstanceSink& sink);
-    Status query(const std::string& nameSpace, const std::string& query, const std::string& language,
+    Status enumerateNames(const std::string& givenNameSpace, const std::string& className, const PathSink& sink);
+    Status get(const ObjectPath& given, const PropertyList& properties, const InstanceSink& sink);
+    Status query(const std::string& givenNameSpace, const std::string& query, const std::string& language,
                  const InstanceSink& sink);
 
     Status modify(const Instance& modified, const PropertyList& properties);
     Status create(const Instance& instance, ObjectPath& created);
-    Status remove(const ObjectPath& path);
-    Status invoke(const ObjectPath& path, const std::string& name, const std::vector<NamedValue>& arguments,
+    Status remove(const ObjectPath& given);
+    Status invoke(const ObjectPath& given, const std::string& name, const std::vector<NamedValue>& arguments,
                   MethodAnswer& answer);
 
     Status associators(const ObjectPath& path, const AssociationFilter& filter, const PropertyList& properties,

@@ -77,9 +77,9 @@ ObjectPath Operations::spelled(const ObjectPath& path) const {
     return spelledPath;
 }
 
-Status Operations::enumerate(const std::string& given, const std::string& className, const PropertyList& properties,
-                             const InstanceSink& sink) {
-    const std::string nameSpace = spellNameSpace(_core.schema, given);
+Status Operations::enumerate(const std::string& givenNameSpace, const std::string& className,
+                             const PropertyList& properties, const InstanceSink& sink) {
+    const std::string nameSpace = spellNameSpace(_core.schema, givenNameSpace);
     const Class& definition = requireClass(_core.schema, nameSpace, className);
     requireProperties(_core.schema, nameSpace, definition, properties);
     for (const auto& [servant, served] : _core.servicesOf(nameSpace, definition)) {
@@ -97,8 +97,9 @@ Status Operations::enumerate(const std::string& given, const std::string& classN
     return {};
 }
 
-Status Operations::enumerateNames(const std::string& given, const std::string& className, const PathSink& sink) {
-    const std::string nameSpace = spellNameSpace(_core.schema, given);
+Status Operations::enumerateNames(const std::string& givenNameSpace, const std::string& className,
+                                  const PathSink& sink) {
+    const std::string nameSpace = spellNameSpace(_core.schema, givenNameSpace);
     const Class& definition = requireClass(_core.schema, nameSpace, className);
     for (const auto& [servant, served] : _core.servicesOf(nameSpace, definition)) {
         InstanceChecks checks(_core.schema, nameSpace, *served, servant.name(), _core.onceLog);
@@ -142,9 +143,9 @@ Status Operations::getChecked(const Class& definition, const ObjectPath& path, c
     return status;
 }
 
-Status Operations::query(const std::string& given, const std::string& query, const std::string& language,
+Status Operations::query(const std::string& givenNameSpace, const std::string& query, const std::string& language,
                          const InstanceSink& sink) {
-    const std::string nameSpace = spellNameSpace(_core.schema, given);
+    const std::string nameSpace = spellNameSpace(_core.schema, givenNameSpace);
     const filter::Filter filter = readQuery(_core.schema, nameSpace, query, language, "the query");
     const PropertyList selected = filter.properties().empty() ? PropertyList{} : PropertyList{filter.properties()};
     return enumerate(nameSpace, filter.className(), std::nullopt, [&](Instance&& instance) {

@@ -25,7 +25,7 @@ std::string spellNameSpace(const Schema& schema, std::string_view nameSpace);
  * before the namespace without slashes of its own, and both may stand in the name of the class. What the schema does
  * not know, stays as it is.
  */
-ObjectPath spellPath(const Schema& schema, const std::string& nameSpace, const ObjectPath& path);
+ObjectPath spellPath(const Schema& schema, const std::string& nameSpace, const ObjectPath& written);
 
 /** A value with all its references, and those in their keys, as spellPath has them. Any other is returned as it is.
  */
