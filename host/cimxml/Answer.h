@@ -21,6 +21,6 @@ struct IntrinsicAnswer {
 };
 
 /** Throws MessageError for what is no such answer, or holds other objects. Any thread. */
-IntrinsicAnswer readIntrinsicAnswer(std::string_view document, const Limits& limits);
+IntrinsicAnswer readIntrinsicAnswer(std::string_view text, const Limits& limits);
 
 } // namespace marlo::cimxml

@@ -117,7 +117,7 @@ struct Message {
  * for. Elements that DSP0201 does not have are refused. Attributes that it does not have are overlooked: clients
  * write those of later versions, and xml:lang, into messages that are else as they should be. Any thread.
  */
-Message readMessage(std::string_view document, const Limits& limits = {});
+Message readMessage(std::string_view text, const Limits& limits = {});
 
 /**
  * A text as a value of a type, as DSP0201 writes it: integers also in hexadecimal, TRUE and FALSE without case,

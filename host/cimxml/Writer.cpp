@@ -39,7 +39,7 @@ struct Writer::State {
 
     void begin(const std::string& messageId, std::string_view request) {
         out += declaration;
-        out += "<CIM CIMVERSION=\"2.0\" DTDVERSION=\"2.0\"><MESSAGE";
+        out += R"(<CIM CIMVERSION="2.0" DTDVERSION="2.0"><MESSAGE)";
         appendAttribute(out, "ID", messageId);
         out += " PROTOCOLVERSION=\"1.0\"><";
         out += request;
@@ -216,7 +216,7 @@ void Writer::value(const Value& value) {
 
 void Writer::exportIndication(const std::string& messageId, const Instance& indication) {
     _state->begin(messageId, "SIMPLEEXPREQ");
-    _state->out += "<EXPMETHODCALL NAME=\"ExportIndication\"><EXPPARAMVALUE NAME=\"NewIndication\">";
+    _state->out += R"(<EXPMETHODCALL NAME="ExportIndication"><EXPPARAMVALUE NAME="NewIndication">)";
     appendInstance(_state->out, indication);
     _state->out += "</EXPPARAMVALUE></EXPMETHODCALL></SIMPLEEXPREQ></MESSAGE></CIM>\n";
 }

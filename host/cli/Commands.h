@@ -16,7 +16,7 @@ enum ExitCode : int { Answered = 0, Failed = 1, WrongUsage = 2 };
  * Runs the command. What it answers goes to the output, as it comes; what went wrong to standard error. Throws
  * UsageError, OutputError.
  */
-ExitCode run(ObjectManager& manager, const Options& options, Output& output);
+ExitCode run(ObjectManager& manager, const Options& given, Output& output);
 
 /** Prints how an operation failed, and what was logged while it was answered; Answered when there is nothing to say.
  */

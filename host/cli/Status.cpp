@@ -35,7 +35,7 @@ std::string showDuration(std::uint64_t seconds) {
 
 std::string showDecimal(double number, const char* unit) {
     std::array<char, 64> text{};
-    std::snprintf(text.data(), text.size(), "%.1f %s", number, unit);
+    static_cast<void>(std::snprintf(text.data(), text.size(), "%.1f %s", number, unit));
     return text.data();
 }
 
@@ -129,7 +129,7 @@ std::string findSocket(const ServerOptions& options) {
         return *options.socket;
     }
     const server::Configuration configuration = server::loadConfiguration(options.configurationFile);
-    const std::string socket = configuration.listen.socket.value_or(server::usualPlaces().socket);
+    std::string socket = configuration.listen.socket.value_or(server::usualPlaces().socket);
     if (socket.empty()) {
         throw server::NotRunning("there is no socket to ask at: name it with --socket");
     }

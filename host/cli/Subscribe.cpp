@@ -125,11 +125,11 @@ class Subscriber {
     Subscriber(const LocalCim& cim, const Options& options) : _cim(cim), _options(options), _before(cim) {}
 
     ~Subscriber() {
-        for (auto made = _made.rbegin(); made != _made.rend(); ++made) {
+        for (; !_made.empty(); _made.pop_back()) {
             try {
-                _cim.remove(*made);
+                _cim.remove(_made.back());
             } catch (const std::exception& error) {
-                complain("could not be taken back: " + made->toString() + ": " + error.what());
+                complain("could not be taken back: " + _made.back().toString() + ": " + error.what());
             }
         }
     }

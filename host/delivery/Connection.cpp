@@ -64,8 +64,8 @@ template <typename Stream>
 class Wire final : public Connection, public std::enable_shared_from_this<Wire<Stream>> {
   public:
     template <typename... Arguments>
-    Wire(const Options& options, const Url& url, Arguments&&... arguments)
-        : _options(options), _url(url), _stream(std::forward<Arguments>(arguments)...) {}
+    Wire(const Options& options, Url url, Arguments&&... arguments)
+        : _options(options), _url(std::move(url)), _stream(std::forward<Arguments>(arguments)...) {}
 
     void open(const std::vector<std::string>& addresses, Opened opened) override {
         _opened = std::move(opened);

@@ -110,7 +110,7 @@ class Ledger {
     Batch takeBatch();
     std::vector<LaneId> settle(const Batch& batch);
     void revoke(const Batch& batch, const std::string& reason, Delivery::Ticket upTo);
-    std::shared_ptr<Event> makeEvent(std::string&& xml);
+    std::shared_ptr<Event> makeEvent(std::shared_ptr<const std::string> xml);
     void cache(const std::shared_ptr<Event>& event);
     void append(Lane& lane, const std::shared_ptr<Event>& event, std::int64_t subscription, std::int64_t now);
     void makeRoom(Lane& lane, std::size_t bytes);

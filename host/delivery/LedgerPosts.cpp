@@ -22,7 +22,7 @@ std::int64_t microsecondsNow() {
 } // namespace
 
 Delivery::Ticket Ledger::post(std::span<const std::string> subscriptions, const Instance& indication) {
-    std::string xml = exportMessage(std::to_string(++_lastMessage), indication);
+    const auto xml = std::make_shared<const std::string>(exportMessage(std::to_string(++_lastMessage), indication));
     const std::int64_t now = microsecondsNow();
     const Lock lock(_mutex);
     if (_isRefusing) {
@@ -32,7 +32,9 @@ Delivery::Ticket Ledger::post(std::span<const std::string> subscriptions, const 
     for (const std::string& key : subscriptions) {
         const auto bearer = _bearers.find(key);
         if (bearer != _bearers.end() && bearer->second.lane) {
-            event = event ? event : makeEvent(std::move(xml));
+            if (!event) {
+                event = makeEvent(xml);
+            }
             append(*bearer->second.lane, event, bearer->second.id, now);
         }
     }
@@ -47,11 +49,11 @@ Delivery::Ticket Ledger::post(std::span<const std::string> subscriptions, const 
     return ++_posted;
 }
 
-std::shared_ptr<Event> Ledger::makeEvent(std::string&& xml) {
+std::shared_ptr<Event> Ledger::makeEvent(std::shared_ptr<const std::string> xml) {
     auto event = std::make_shared<Event>();
     event->id = ++_lastEvent;
-    event->bytes = xml.size();
-    event->xml = std::make_shared<const std::string>(std::move(xml));
+    event->bytes = xml->size();
+    event->xml = std::move(xml);
     _pending.events.emplace_back(event->id, event->xml);
     return event;
 }
@@ -97,8 +99,8 @@ void Ledger::announceLoss(Lane& lane) {
          " indications were dropped, SequenceNumber " + std::to_string(loss.first) + " to " +
          std::to_string(loss.last));
     const std::int64_t now = microsecondsNow();
-    const auto event =
-        makeEvent(exportMessage(std::to_string(++_lastMessage), lossNotice(loss.count, loss.first, loss.last, now)));
+    const auto event = makeEvent(std::make_shared<const std::string>(
+        exportMessage(std::to_string(++_lastMessage), lossNotice(loss.count, loss.first, loss.last, now))));
     append(lane, event, 0, now);
     cache(event);
     ++_posted;

@@ -67,9 +67,9 @@ std::string inSequence(std::string_view message, std::string_view context, std::
     std::string result;
     result.reserve(message.size() + 256);
     result = message.substr(0, end);
-    result += "<PROPERTY NAME=\"SequenceContext\" TYPE=\"string\"><VALUE>";
+    result += R"(<PROPERTY NAME="SequenceContext" TYPE="string"><VALUE>)";
     cimxml::appendText(result, context);
-    result += "</VALUE></PROPERTY><PROPERTY NAME=\"SequenceNumber\" TYPE=\"sint64\"><VALUE>";
+    result += R"(</VALUE></PROPERTY><PROPERTY NAME="SequenceNumber" TYPE="sint64"><VALUE>)";
     result += std::to_string(number);
     result += "</VALUE></PROPERTY>";
     result += message.substr(end);

@@ -14,8 +14,8 @@ constexpr Pace::Time glance = std::chrono::seconds(1);
 
 } // namespace
 
-Reply::Reply(Stream& stream, int descriptor, const std::atomic<bool>& isCut, const Terms& terms)
-    : _stream(stream), _descriptor(descriptor), _isCut(isCut), _terms(terms) {}
+Reply::Reply(Stream& stream, int descriptor, const std::atomic<bool>& isCut, Terms terms)
+    : _stream(stream), _descriptor(descriptor), _isCut(isCut), _terms(std::move(terms)) {}
 
 void Reply::require(bool isInOrder) const {
     if (!isInOrder) {

@@ -39,7 +39,7 @@ struct Terms {
 class Reply : public Responder {
   public:
     /** `isCut` becomes true, and the descriptor is shut down, when nothing is to be waited for any more. */
-    Reply(Stream& stream, int descriptor, const std::atomic<bool>& isCut, const Terms& terms);
+    Reply(Stream& stream, int descriptor, const std::atomic<bool>& isCut, Terms terms);
 
     void send(Answer&& answer) override;
     void begin(unsigned status, Fields&& fields) override;

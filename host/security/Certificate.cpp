@@ -66,7 +66,8 @@ void checkPrivate(const std::string& file) {
     }
     if ((status.st_mode & forbiddenKeyModes) != 0) {
         std::array<char, 8> mode{};
-        std::snprintf(mode.data(), mode.size(), "%04o", static_cast<unsigned>(status.st_mode & 07777U));
+        static_cast<void>(
+            std::snprintf(mode.data(), mode.size(), "%04o", static_cast<unsigned>(status.st_mode & 07777U)));
         fail(file, std::string("a key of mode ") + mode.data() + " is not private; 0600 would do");
     }
     if (status.st_uid != 0 && status.st_uid != ::geteuid()) {
@@ -190,7 +191,8 @@ std::string fingerprint(const std::string& certificateFile) {
     std::string text = "SHA-256 ";
     for (unsigned index = 0; index < size; ++index) {
         std::array<char, 4> pair{};
-        std::snprintf(pair.data(), pair.size(), index == 0 ? "%02X" : ":%02X", static_cast<unsigned>(bytes[index]));
+        static_cast<void>(std::snprintf(pair.data(), pair.size(), index == 0 ? "%02X" : ":%02X",
+                                        static_cast<unsigned>(bytes[index])));
         text += pair.data();
     }
     return text;

@@ -30,8 +30,8 @@ std::string shown(std::string_view name) {
             text += character;
         } else {
             char escape[5];
-            std::snprintf(escape, sizeof escape, "\\x%02x",
-                          static_cast<unsigned>(static_cast<unsigned char>(character)));
+            static_cast<void>(std::snprintf(escape, sizeof escape, "\\x%02x",
+                                            static_cast<unsigned>(static_cast<unsigned char>(character))));
             text += escape;
         }
     }

@@ -137,7 +137,8 @@ Daemon::State::State(DaemonOptions&& given)
       listeners(chooseListeners(configuration.listen, usualPlaces().socket, options.trial)) {
     // One heap for all threads: a large answer leaves its memory to the next one, whichever thread makes that.
     ::mallopt(M_ARENA_MAX, 1);
-    ::signal(SIGPIPE, SIG_IGN); // a client or a reader of the log that goes away is an error where it is written to
+    static_cast<void>(::signal(
+        SIGPIPE, SIG_IGN)); // a client or a reader of the log that goes away is an error where it is written to
     if (usesTls(listeners.endpoints)) {
         tls = findCertificate(configuration);
         announcement.fingerprint = security::fingerprint(tls->certificateFile);

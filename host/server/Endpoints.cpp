@@ -107,7 +107,7 @@ unsigned short parsePort(const std::string& text) {
 
 http::Endpoint parseEndpoint(const std::string& text, http::Transport transport) {
     const auto [address, port] = splitPort(text);
-    const http::Endpoint endpoint{transport, address, parsePort(port)};
+    http::Endpoint endpoint{transport, address, parsePort(port)};
     const bool isSix = internetAddress(endpoint).storage.ss_family == AF_INET6;
     if (internetAddress(endpoint).length == 0 || isSix != text.starts_with('[')) {
         throw std::invalid_argument("expected a numeric address, found \"" + text + '"');

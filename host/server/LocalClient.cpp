@@ -8,6 +8,8 @@
 #include <boost/beast/http/read.hpp>
 #include <boost/beast/http/string_body.hpp>
 #include <boost/beast/http/write.hpp>
+#include <string>
+#include <utility>
 
 namespace marlo::server {
 
@@ -25,8 +27,8 @@ class Exchange {
   public:
     using Request = beast::http::request<beast::http::string_body>;
 
-    Exchange(const std::string& socket, Request request)
-        : _stream(_context), _socket(socket), _request(std::move(request)) {
+    Exchange(std::string socket, Request request)
+        : _stream(_context), _socket(std::move(socket)), _request(std::move(request)) {
         _request.set(beast::http::field::host, "localhost");
         _request.keep_alive(false);
         _request.prepare_payload();

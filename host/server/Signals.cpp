@@ -21,7 +21,7 @@ sigset_t makeSet(std::initializer_list<int> numbers) {
 
 } // namespace
 
-Signals::Signals(std::initializer_list<int> numbers) : _descriptor(-1) {
+Signals::Signals(std::initializer_list<int> numbers) {
     const sigset_t set = makeSet(numbers);
     _descriptor = ::signalfd(-1, &set, SFD_CLOEXEC | SFD_NONBLOCK);
     if (_descriptor < 0) {

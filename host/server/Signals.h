@@ -27,7 +27,7 @@ class Signals {
 
   private:
     sigset_t _before{};
-    int _descriptor;
+    int _descriptor = -1;
 };
 
 } // namespace marlo::server

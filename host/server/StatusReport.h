@@ -55,7 +55,7 @@ struct StatusReport {
 std::string toJson(const StatusReport& report);
 
 /** What toJson wrote; throws std::invalid_argument for anything else. */
-StatusReport parseStatusReport(const std::string& json);
+StatusReport parseStatusReport(const std::string& text);
 
 /** Of this process (proc(5), statm); 0 where that cannot be read. */
 std::uint64_t residentBytes();

@@ -38,7 +38,7 @@ bool stopServer(http::Server& server, const Signals& signals, Log& log) {
     const auto stopped = std::async(std::launch::async, [&server] { server.stop(StopPatience); });
     while (stopped.wait_for(Glance) != std::future_status::ready) {
         const auto signal = signals.take();
-        if (signal == SIGTERM || signal == SIGINT) {
+        if (signal && (*signal == SIGTERM || *signal == SIGINT)) {
             endAtOnce(server, log, "told once more to end");
         }
         if (Clock::now() > end) {

@@ -1,5 +1,6 @@
 #include "host/subscriptions/Activations.h"
 
+#include <algorithm>
 #include <span>
 #include <utility>
 
@@ -35,12 +36,12 @@ Status Activations::subscribe(const Object& subscription, const Instance& filter
 
 Status Activations::unsubscribe(const Numbers& numbers) {
     Status status;
-    for (auto number = numbers.rbegin(); number != numbers.rend(); ++number) {
-        Status ended = _manager.unsubscribe(*number);
+    std::for_each(numbers.rbegin(), numbers.rend(), [&](const Numbers::value_type& number) {
+        Status ended = _manager.unsubscribe(number);
         if (status.ok()) {
             status = std::move(ended);
         }
-    }
+    });
     return status;
 }
 

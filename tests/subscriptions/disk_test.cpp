@@ -51,8 +51,8 @@ TEST_F(FullDisk, LosesNothingThatProvidersWereToldIsTaken) {
     EXPECT_GT(json({"status"})["deliveries"][0]["dropped"], 0) << "it is counted";
 
     const std::string process = std::to_string(server().id());
-    const Outcome grown =
-        runProgram({"nsenter", "-t", process, "-m", "mount", "-o", "remount,size=200m", path("state")});
+    const Outcome grown = // with its root as well, which is not that of the namespace where it was changed
+        runProgram({"nsenter", "-t", process, "-m", "-r", "mount", "-o", "remount,size=200m", path("state")});
     ASSERT_EQ(grown.exitCode, 0) << grown.err;
     ASSERT_TRUE(eventually([&] { return taken() > full + 100; })) << "it recovers by itself";
     EXPECT_THAT(log(), HasSubstr("indications are kept on disk again"));
